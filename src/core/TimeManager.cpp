@@ -1,0 +1,272 @@
+#include "core/TimeManager.h"
+
+#include "diag/Assert.h"
+#include "diag/Log.h"
+
+#include <chrono>
+#include <cmath>
+#include <vector>
+
+namespace ox::core {
+
+uint32_t g_FrameTime = 0;
+
+namespace {
+
+// Only whole speeds are allowed; the fraction is a contract failure and is dropped.
+int8_t WholeSpeed(float _k)
+{
+    OX_ASSERT(fabs(_k - (float((int)_k))) < 0.001);
+    return static_cast<int8_t>(static_cast<int>(_k));
+}
+
+} // namespace
+
+// ---- raw clock ----
+
+double CPlatformTimer::MonotonicMilliseconds()
+{
+    using namespace std::chrono;
+    return duration<double, std::milli>(steady_clock::now().time_since_epoch()).count();
+}
+
+CPlatformTimer::CPlatformTimer() : CPlatformTimer(&CPlatformTimer::MonotonicMilliseconds) {}
+
+CPlatformTimer::CPlatformTimer(Source source) : m_Source(std::move(source)), m_Base(m_Source())
+{
+    OX_LOG("core", diag::LogInfo, "Time system choose monotonic clock");
+}
+
+// ---- CTimer ----
+
+void CTimer::SetK(float _k) { m_K = WholeSpeed(_k); }
+
+void CTimer::Pause(bool flag)
+{
+    if (flag)
+        ++m_PauseCount;
+    else if (m_PauseCount)
+        --m_PauseCount;
+}
+
+void CTimer::Destroy() { m_Manager->RemoveTimer(this); }
+
+void CTimer::Update(int step)
+{
+    if (m_PauseCount) {
+        m_FrameDelta = 0;
+        return;
+    }
+    m_FrameDelta = static_cast<int16_t>(m_K * step);
+    m_Time += static_cast<int32_t>(m_FrameDelta);
+}
+
+void CTimer::SetParent(CGroupTimer* parent)
+{
+    if (m_Parent && m_Manager->IsKnown(m_Parent))
+        m_Parent->m_ChildTimers.erase(this);
+    m_Parent = parent;
+    if (m_Parent)
+        m_Parent->m_ChildTimers.insert(this);
+}
+
+CTimer* CTimer::Clone(CGroupTimer* parent) const
+{
+    CTimer* copy = m_Manager->AttachTimer(parent ? parent : m_Parent);
+    copy->m_Time = m_Time;
+    copy->m_FrameDelta = m_FrameDelta;
+    copy->m_PauseCount = m_PauseCount;
+    copy->m_K = m_K;
+    return copy;
+}
+
+// ---- CGroupTimer ----
+
+CGroupTimer::CGroupTimer(CTimeManager* manager, const char* id, CGroupTimer* parent)
+    : m_Manager(manager), m_Id(id ? id : ""), m_Parent(parent)
+{
+}
+
+CTimer* CGroupTimer::AttachTimer() { return m_Manager->AttachTimer(this); }
+
+CGroupTimer* CGroupTimer::AttachGroupTimer(const char* id) { return m_Manager->AttachGroupTimer(id, this); }
+
+CGroupTimer* CGroupTimer::GetChildGroupTimer(const char* id) const
+{
+    if (!id || !*id)
+        return nullptr;
+    for (CGroupTimer* child : m_ChildGroups)
+        if (child->m_Id == id)
+            return child;
+    return nullptr;
+}
+
+void CGroupTimer::SetK(float _k) { m_K = WholeSpeed(_k); }
+
+void CGroupTimer::Pause(bool flag)
+{
+    if (flag)
+        ++m_PauseCount;
+    else if (m_PauseCount)
+        --m_PauseCount;
+}
+
+void CGroupTimer::Destroy() { m_Manager->RemoveGroupTimer(this); }
+
+void CGroupTimer::Update(int step)
+{
+    if (m_PauseCount) {
+        m_FrameDelta = 0;
+    } else {
+        m_FrameDelta = static_cast<int16_t>(m_K * step);
+        m_Time += static_cast<int32_t>(m_FrameDelta);
+    }
+    for (CTimer* timer : m_ChildTimers)
+        timer->Update(m_FrameDelta);
+    for (CGroupTimer* group : m_ChildGroups)
+        group->Update(m_FrameDelta);
+}
+
+void CGroupTimer::SetParent(CGroupTimer* parent)
+{
+    if (m_Parent && m_Manager->IsKnown(m_Parent))
+        m_Parent->m_ChildGroups.erase(this);
+    m_Parent = parent;
+    if (m_Parent)
+        m_Parent->m_ChildGroups.insert(this);
+}
+
+CGroupTimer* CGroupTimer::Clone(CGroupTimer* parent) const
+{
+    OX_ASSERT(m_Id.empty() && "Timer with non-empty Id is not copyable!");
+    CGroupTimer* copy = m_Manager->AttachGroupTimer("", parent ? parent : m_Parent);
+    copy->m_Time = m_Time;
+    copy->m_FrameDelta = m_FrameDelta;
+    copy->m_PauseCount = m_PauseCount;
+    copy->m_K = m_K;
+    for (CTimer* timer : m_ChildTimers)
+        timer->Clone(copy);
+    for (CGroupTimer* group : m_ChildGroups)
+        group->Clone(copy);
+    return copy;
+}
+
+// ---- CTimeManager ----
+
+CTimeManager::CTimeManager() : CTimeManager(&CPlatformTimer::MonotonicMilliseconds) {}
+
+CTimeManager::CTimeManager(CPlatformTimer::Source clock) : m_Clock(std::move(clock))
+{
+    m_Root = AttachGroupTimer("", nullptr);
+    m_Time = static_cast<int32_t>(static_cast<float>(m_Clock.Read()));
+    m_Offset = 20.0f;
+}
+
+CTimeManager::~CTimeManager()
+{
+    for (CTimer* timer : m_Timers)
+        delete timer;
+    for (CGroupTimer* group : m_GroupTimers)
+        delete group;
+}
+
+CTimeManager& CTimeManager::Instance()
+{
+    static CTimeManager* instance = new CTimeManager();
+    return *instance;
+}
+
+CTimeManager& GetTimeManager() { return CTimeManager::Instance(); }
+
+void CTimeManager::Update()
+{
+    float now = static_cast<float>(m_Clock.Read());
+    float delta = now - m_Offset - static_cast<float>(m_Time);
+    m_Time = static_cast<int32_t>(now - m_Offset);
+    g_FrameTime = static_cast<uint32_t>(m_Time);
+    int step = static_cast<int>(delta);
+    if (step > kMaxFrameStep)
+        step = kMaxFrameStep;
+    m_Root->Update(step);
+    m_FrameDelta = m_Root->GetFrameDelta();
+}
+
+void CTimeManager::Pause(bool flag)
+{
+    bool wasPaused = m_Root->IsPaused();
+    m_Root->Pause(flag);
+    if (wasPaused && !m_Root->IsPaused()) {
+        // Strike out the time spent paused: the clock resumes where it stopped.
+        float now = static_cast<float>(m_Clock.Read());
+        m_Offset = now - static_cast<float>(m_Time);
+        m_Time = static_cast<int32_t>(now - m_Offset);
+    }
+}
+
+CTimer* CTimeManager::AttachTimer(CGroupTimer* parent)
+{
+    if (!parent)
+        parent = m_Root;
+    auto* timer = new CTimer(this, parent);
+    m_Timers.insert(timer);
+    if (parent)
+        parent->m_ChildTimers.insert(timer);
+    OX_ASSERT(!parent || m_GroupTimers.find(parent) != m_GroupTimers.end());
+    return timer;
+}
+
+CGroupTimer* CTimeManager::AttachGroupTimer(const char* id, CGroupTimer* parent)
+{
+    if (!parent)
+        parent = m_Root;
+    auto* group = new CGroupTimer(this, id, parent);
+    m_GroupTimers.insert(group);
+    if (!group->m_Id.empty())
+        m_NamedGroupTimers[group->m_Id] = group;
+    if (parent)
+        parent->m_ChildGroups.insert(group);
+    OX_ASSERT(!parent || m_GroupTimers.find(parent) != m_GroupTimers.end());
+    return group;
+}
+
+CGroupTimer* CTimeManager::GetTimer(const char* id) const
+{
+    if (!id || !*id)
+        return nullptr;
+    auto it = m_NamedGroupTimers.find(misc::StringA24(id));
+    return it == m_NamedGroupTimers.end() ? nullptr : it->second;
+}
+
+void CTimeManager::RemoveTimer(CTimer* timer)
+{
+    if (m_Timers.erase(timer) == 0)
+        return;
+    if (timer->m_Parent && IsKnown(timer->m_Parent))
+        timer->m_Parent->m_ChildTimers.erase(timer);
+    delete timer;
+}
+
+void CTimeManager::RemoveGroupTimer(CGroupTimer* group)
+{
+    if (!IsKnown(group))
+        return;
+    if (!group->m_Id.empty()) {
+        auto it = m_NamedGroupTimers.find(group->m_Id);
+        if (it != m_NamedGroupTimers.end() && it->second == group)
+            m_NamedGroupTimers.erase(it);
+    }
+    if (group->m_Parent && IsKnown(group->m_Parent))
+        group->m_Parent->m_ChildGroups.erase(group);
+    std::vector<CTimer*> timers(group->m_ChildTimers.begin(), group->m_ChildTimers.end());
+    for (CTimer* timer : timers)
+        RemoveTimer(timer);
+    std::vector<CGroupTimer*> groups(group->m_ChildGroups.begin(), group->m_ChildGroups.end());
+    for (CGroupTimer* child : groups)
+        RemoveGroupTimer(child);
+    m_GroupTimers.erase(group);
+    if (group == m_Root)
+        m_Root = nullptr;
+    delete group;
+}
+
+} // namespace ox::core

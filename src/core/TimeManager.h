@@ -1,0 +1,177 @@
+#pragma once
+// Game time: one tree of timers under a root group. The root advances once per frame by the
+// measured frame time, capped at 100 ms. Every timer and group has its own clock, nesting
+// pause count and whole-number speed; a paused group stops everything below it.
+#include "misc/String.h"
+
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <set>
+
+namespace ox::core {
+
+class CTimeManager;
+class CGroupTimer;
+
+// The raw clock: real time in milliseconds since it was made, from one monotonic source.
+class CPlatformTimer {
+public:
+    using Source = std::function<double()>; // any monotonic millisecond reading
+
+    CPlatformTimer();
+    explicit CPlatformTimer(Source source);
+    double Read() const { return m_Source() - m_Base; }
+
+    static double MonotonicMilliseconds();
+
+private:
+    Source m_Source;
+    double m_Base;
+};
+
+class CTimer {
+public:
+    void SetK(float _k);
+    float GetK() const { return m_K; }
+    unsigned GetTime() const { return m_Time; }
+    void SetTime(unsigned time) { m_Time = time; }
+    int GetFrameDelta() const { return m_FrameDelta; }
+    void Pause(bool flag);
+    bool IsPaused() const { return m_PauseCount != 0; }
+    void Destroy();
+
+    CGroupTimer* GetParent() const { return m_Parent; }
+    void SetParent(CGroupTimer* parent);
+    CTimer* Clone(CGroupTimer* parent) const;
+
+private:
+    friend class CTimeManager;
+    friend class CGroupTimer;
+    CTimer(CTimeManager* manager, CGroupTimer* parent) : m_Manager(manager), m_Parent(parent) {}
+    ~CTimer() = default;
+    void Update(int step);
+
+    CTimeManager* m_Manager;
+    uint32_t m_Time = 0;
+    int16_t m_FrameDelta = 0;
+    uint8_t m_PauseCount = 0;
+    int8_t m_K = 1;
+    CGroupTimer* m_Parent;
+};
+
+class CGroupTimer {
+public:
+    const misc::StringA24& GetId() const { return m_Id; }
+    CTimer* AttachTimer();
+    CGroupTimer* AttachGroupTimer(const char* id);
+    // A direct child group with this id (no recursion); null for an empty id.
+    CGroupTimer* GetChildGroupTimer(const char* id) const;
+
+    void SetK(float _k);
+    float GetK() const { return m_K; }
+    unsigned GetTime() const { return m_Time; }
+    void SetTime(unsigned time) { m_Time = time; }
+    int GetFrameDelta() const { return m_FrameDelta; }
+    void Pause(bool flag);
+    bool IsPaused() const { return m_PauseCount != 0; }
+    void Destroy();
+
+    CGroupTimer* GetParent() const { return m_Parent; }
+    void SetParent(CGroupTimer* parent);
+    CGroupTimer* Clone(CGroupTimer* parent) const;
+
+    const std::set<CTimer*>& GetChildTimers() const { return m_ChildTimers; }
+    const std::set<CGroupTimer*>& GetChildGroups() const { return m_ChildGroups; }
+
+private:
+    friend class CTimeManager;
+    friend class CTimer;
+    CGroupTimer(CTimeManager* manager, const char* id, CGroupTimer* parent);
+    ~CGroupTimer() = default;
+    void Update(int step);
+
+    CTimeManager* m_Manager;
+    misc::StringA24 m_Id;
+    std::set<CGroupTimer*> m_ChildGroups;
+    std::set<CTimer*> m_ChildTimers;
+    uint32_t m_Time = 0;
+    int16_t m_FrameDelta = 0;
+    uint8_t m_PauseCount = 0;
+    int8_t m_K = 1;
+    CGroupTimer* m_Parent;
+};
+
+// m_Time of the manager as of its last update, for code that wants a frame-stable clock.
+extern uint32_t g_FrameTime;
+
+class CTimeManager {
+public:
+    static constexpr int kMaxFrameStep = 100;
+
+    CTimeManager();
+    explicit CTimeManager(CPlatformTimer::Source clock);
+    ~CTimeManager();
+    CTimeManager(const CTimeManager&) = delete;
+    CTimeManager& operator=(const CTimeManager&) = delete;
+
+    // The process-wide manager, created at first use and never destroyed.
+    static CTimeManager& Instance();
+
+    void Update();
+    void Pause(bool flag);
+    int GetTime() const { return m_Time; }
+    unsigned GetAppTime() const { return m_Root->GetTime(); }
+    int GetFrameDelta() const { return m_FrameDelta; }
+    CGroupTimer* GetRoot() const { return m_Root; }
+
+    CTimer* AttachTimer(CGroupTimer* parent);
+    CGroupTimer* AttachGroupTimer(const char* id, CGroupTimer* parent);
+    CGroupTimer* GetTimer(const char* id) const;
+    void RemoveTimer(CTimer* timer);
+    void RemoveGroupTimer(CGroupTimer* group);
+
+    bool IsKnown(const CTimer* timer) const { return m_Timers.count(const_cast<CTimer*>(timer)) != 0; }
+    bool IsKnown(const CGroupTimer* group) const { return m_GroupTimers.count(const_cast<CGroupTimer*>(group)) != 0; }
+
+private:
+    CPlatformTimer m_Clock;
+    std::set<CTimer*> m_Timers;
+    std::set<CGroupTimer*> m_GroupTimers;
+    std::map<misc::StringA24, CGroupTimer*> m_NamedGroupTimers;
+    CGroupTimer* m_Root = nullptr;
+    int32_t m_Time = 0;
+    float m_Offset = 20.0f;
+    int32_t m_FrameDelta = 0;
+};
+
+CTimeManager& GetTimeManager();
+
+// Owns a timer: destroys it on destruction or on a new assignment.
+template <class T>
+class CBasicTimerWrapper {
+public:
+    CBasicTimerWrapper() = default;
+    explicit CBasicTimerWrapper(T* timer) : m_Timer(timer) {}
+    ~CBasicTimerWrapper() { Reset(nullptr); }
+    CBasicTimerWrapper(const CBasicTimerWrapper&) = delete;
+    CBasicTimerWrapper& operator=(const CBasicTimerWrapper&) = delete;
+    CBasicTimerWrapper& operator=(T* timer) { Reset(timer); return *this; }
+
+    T* Get() { return m_Timer; }
+    const T* Get() const { return m_Timer; }
+    void Reset(T* timer)
+    {
+        if (m_Timer && m_Timer != timer)
+            m_Timer->Destroy();
+        m_Timer = timer;
+    }
+
+private:
+    T* m_Timer = nullptr;
+};
+
+using CTimerWrapper = CBasicTimerWrapper<CTimer>;
+using CGroupTimerWrapper = CBasicTimerWrapper<CGroupTimer>;
+
+} // namespace ox::core
