@@ -2,6 +2,8 @@
 BUILD_DIR ?= build
 BUILD_TYPE ?= RelWithDebInfo
 CTEST_ARGS ?=
+FUZZ_DIR ?= fuzz-build
+FUZZ_SECONDS ?= 60
 
 .PHONY: all deps configure build test run bench fuzz clean
 
@@ -30,5 +32,20 @@ run: build
 bench: build
 	@for b in $(BUILD_DIR)/bench/bench_*; do [ -x "$$b" ] && "$$b"; done
 
+# Builds every fuzz/fuzz_* target with clang and runs each for FUZZ_SECONDS; findings
+# (crash-*, leak-*, timeout-*) land in $(FUZZ_DIR)/findings.
+fuzz: deps
+	@CC=clang CXX=clang++ cmake -S . -B $(FUZZ_DIR) -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+		-DOX_BUILD_FUZZ=ON -DOX_BUILD_TESTS=OFF -DOX_BUILD_BENCH=OFF >/dev/null
+	@cmake --build $(FUZZ_DIR)
+	@mkdir -p $(FUZZ_DIR)/findings
+	@for f in $(FUZZ_DIR)/fuzz/fuzz_*; do \
+		[ -x "$$f" ] || continue; \
+		name=$$(basename $$f); mkdir -p $(FUZZ_DIR)/corpus/$$name; \
+		echo "fuzz: $$name for $(FUZZ_SECONDS) s"; \
+		"$$f" -max_total_time=$(FUZZ_SECONDS) -artifact_prefix=$(FUZZ_DIR)/findings/$$name- \
+			$(FUZZ_DIR)/corpus/$$name fuzz/corpus/$$name 2>&1 | tail -3 || exit 1; \
+	done
+
 clean:
-	rm -rf $(BUILD_DIR)
+	rm -rf $(BUILD_DIR) $(FUZZ_DIR)
