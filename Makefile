@@ -42,9 +42,13 @@ fuzz: deps
 	@for f in $(FUZZ_DIR)/fuzz/fuzz_*; do \
 		[ -x "$$f" ] || continue; \
 		name=$$(basename $$f); mkdir -p $(FUZZ_DIR)/corpus/$$name; \
+		seeds=""; [ -d fuzz/corpus/$$name ] && seeds=fuzz/corpus/$$name; \
 		echo "fuzz: $$name for $(FUZZ_SECONDS) s"; \
-		"$$f" -max_total_time=$(FUZZ_SECONDS) -artifact_prefix=$(FUZZ_DIR)/findings/$$name- \
-			$(FUZZ_DIR)/corpus/$$name fuzz/corpus/$$name 2>&1 | tail -3 || exit 1; \
+		if ! "$$f" -max_total_time=$(FUZZ_SECONDS) -artifact_prefix=$(FUZZ_DIR)/findings/$$name- \
+			$(FUZZ_DIR)/corpus/$$name $$seeds >$(FUZZ_DIR)/$$name.log 2>&1; then \
+			tail -40 $(FUZZ_DIR)/$$name.log; exit 1; \
+		fi; \
+		grep -E "^#[0-9]+ +DONE|Done [0-9]+ runs" $(FUZZ_DIR)/$$name.log | tail -2; \
 	done
 
 clean:
