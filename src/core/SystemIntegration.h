@@ -1,0 +1,55 @@
+#pragma once
+// The interface between the application and the operating system: one window, one
+// message loop, the mouse cursor and the screen geometry.
+#include "core/platform/Event.h"
+
+#include <string>
+
+namespace ox::core {
+
+struct IntRect {
+    int X = 0, Y = 0, Width = 0, Height = 0;
+};
+struct IntPoint {
+    int X = 0, Y = 0;
+};
+
+// What the loop calls back: the application.
+class IPlatformClient {
+public:
+    virtual ~IPlatformClient() = default;
+    virtual void ProcessEvent() = 0; // the adapter's current event
+    virtual void Update() = 0;
+    virtual void Draw() = 0;
+};
+
+enum CursorType : unsigned { CursorArrow = 0, CursorHand = 1, CursorIBeam = 2, CursorWait = 3 };
+
+class CSystemIntegration {
+public:
+    virtual ~CSystemIntegration() = default;
+    virtual bool Init() = 0;
+    virtual void Run() = 0;
+    virtual void Stop() = 0;
+    virtual void Shutdown() = 0;
+    virtual bool CheckSingleInstance() = 0;
+    virtual void RunNested() = 0;
+    virtual void StopNested() = 0;
+    virtual bool SetScreenMode(bool fullscreen, bool bpp32, unsigned width, unsigned height) = 0;
+    virtual bool GetDesktopResolution(unsigned* width, unsigned* height) = 0;
+    virtual SystemEvent* GetCurrentEvent() = 0;
+    virtual void DefaultProcess() = 0;
+    virtual IntRect GetClientRect() = 0;
+    virtual void AdjustRect(IntRect& rect) = 0;
+    virtual IntRect GetWorkArea() = 0;
+    virtual void ScreenToClient(IntPoint& point) = 0;
+    virtual void ClientToScreen(IntPoint& point) = 0;
+    virtual void SetCursorPos(IntPoint point) = 0;
+    virtual IntPoint GetCursorPos() = 0;
+    virtual void SetCursorType(unsigned type, bool applyNow) = 0;
+    virtual unsigned GetCursorType() = 0;
+    virtual void ShowCursor(bool show) = 0;
+    virtual bool IsCursorVisible() = 0;
+};
+
+} // namespace ox::core
