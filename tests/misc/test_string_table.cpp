@@ -1,0 +1,88 @@
+#include "misc/StringTable.h"
+#include "support/TestSupport.h"
+
+using ox::misc::CStringTable;
+using ox::wstring;
+
+namespace {
+std::vector<std::pair<int, wstring>> Sample()
+{
+    return {{5, u"five"}, {1, u"one"}, {3, u"three"}, {0, u"zero"}, {3, u"three again"}, {12, u"\u0416"}};
+}
+} // namespace
+
+TEST(StringTable, LookupsAndReferences)
+{
+    CStringTable table;
+    EXPECT_EQ(wstring(table.GetString(7)), u"String \"$7\" has not found!") << "no table at all";
+    table.BuildFromTexts(Sample());
+    EXPECT_EQ(table.GetCount(), 6u) << "duplicates stay";
+    EXPECT_EQ(wstring(table.GetString(1)), u"one");
+    EXPECT_EQ(wstring(table.GetString(12)), u"\u0416");
+    wstring three = table.GetString(3);
+    EXPECT_TRUE(three == u"three" || three == u"three again");
+    EXPECT_EQ(wstring(table.GetString(-4)), u"String \"$-4\" has not found!");
+
+    EXPECT_EQ(table.FormatByStringsID(wstring(u"100$$")), u"100$");
+    EXPECT_EQ(table.FormatByStringsID(wstring(u"a$5b")), u"afiveb");
+    EXPECT_EQ(table.FormatByStringsID(wstring(u"a$")), u"azero");
+    EXPECT_EQ(table.FormatByStringsID(wstring(u"$1$5")), u"onefive");
+    EXPECT_EQ(table.FormatByStringsID(wstring(u"$$5 $99")), u"$5 String \"$99\" has not found!");
+    EXPECT_EQ(table.FormatByStringsID(std::string("x$12")), u"x\u0416");
+    EXPECT_EQ(table.FormatByStringsID(static_cast<const char*>(nullptr)), u"");
+
+    CStringTable single;
+    single.BuildFromTexts({{42, u"only"}});
+    EXPECT_EQ(wstring(single.GetString(42)), u"only");
+    EXPECT_EQ(wstring(single.GetString(41)), u"String \"$41\" has not found!");
+}
+
+TEST(StringTable, InPlaceTablesAreCheckedBeforeUse)
+{
+    oxtest::LogCapture log;
+    std::vector<uint8_t> good = CStringTable::BuildBinary16(Sample(), "S16\x01");
+    CStringTable table;
+    ASSERT_TRUE(table.UseTable(good.data(), good.size(), "strings.bindump"));
+    EXPECT_EQ(reinterpret_cast<const uint8_t*>(table.GetString(0)) - good.data() > 0, true) << "used in place";
+    EXPECT_EQ(wstring(table.GetString(5)), u"five");
+
+    std::vector<uint8_t> badMagic = good;
+    badMagic[3] = 'X';
+    EXPECT_FALSE(table.UseTable(badMagic.data(), badMagic.size(), "strings.bindump"));
+    std::vector<uint8_t> truncated(good.begin(), good.begin() + good.size() - 3);
+    EXPECT_FALSE(table.UseTable(truncated.data(), truncated.size(), "strings.bindump"));
+    std::vector<uint8_t> hugeCount = good;
+    hugeCount[7] = 0x7F;
+    EXPECT_FALSE(table.UseTable(hugeCount.data(), hugeCount.size(), "strings.bindump"));
+    EXPECT_TRUE(log.Contains("strings.bindump: entry"));
+    EXPECT_TRUE(log.Contains("do not fit"));
+    EXPECT_EQ(wstring(table.GetString(5)), u"five") << "a refused table leaves the old one";
+}
+
+TEST(StringTable, BinaryDumpsRoundTrip)
+{
+    oxtest::TempDir dir;
+    oxtest::ScopedCwd cwd(dir.Path());
+    CStringTable empty;
+    EXPECT_FALSE(empty.SaveBinaryDumps());
+
+    CStringTable table;
+    table.BuildFromTexts(Sample());
+    ASSERT_TRUE(table.SaveBinaryDumps());
+    std::string utf16 = oxtest::ReadFile(dir / "strings.xml.bin_utf16le");
+    std::string utf32 = oxtest::ReadFile(dir / "strings.xml.bin_utf32le");
+    ASSERT_EQ(utf16.substr(0, 4), "S16L");
+    ASSERT_EQ(utf32.substr(0, 4), "S32L");
+
+    CStringTable reread;
+    ASSERT_TRUE(reread.UseTable(reinterpret_cast<const uint8_t*>(utf16.data()), utf16.size(), "utf16"));
+    EXPECT_EQ(wstring(reread.GetString(12)), u"\u0416");
+    // The 32-bit form: same index, offsets to 4-byte characters.
+    uint32_t offset;
+    memcpy(&offset, utf32.data() + 8 + 8 * 5 + 4, 4); // the entry with id 12, last after sorting
+    uint32_t ch;
+    memcpy(&ch, utf32.data() + offset, 4);
+    EXPECT_EQ(ch, 0x0416u);
+    memcpy(&ch, utf32.data() + offset + 4, 4);
+    EXPECT_EQ(ch, 0u);
+}
