@@ -186,7 +186,9 @@ bool CGamePack::CheckPack()
             return refuse(Format("entry %u (%s): the data offset is not a multiple of 4", i, path));
         if (entry.offset < tableEnd + sizeof(uint32_t))
             return refuse(Format("entry %u (%s): the data overlaps the table", i, path));
-        if (uint64_t(entry.offset) + entry.size > m_Size)
+        // Even an empty file starts inside the mapping, so that its pointer is known as
+        // one of the pack's.
+        if (entry.offset >= m_Size || uint64_t(entry.offset) + entry.size > m_Size)
             return refuse(Format("entry %u (%s): the data lies past the end of the file", i, path));
     }
     return true;

@@ -136,6 +136,10 @@ bool CPackWriter::Emit(const Sink& sink)
         uint64_t offset = position + sizeof(uint32_t);
         entry.offset = static_cast<uint32_t>(offset);
         position = AlignUp4(offset + m_Items[i].size);
+        // An empty file last would start at the very end; the pack then ends in a word
+        // of padding, so that every file starts inside it.
+        if (i + 1 == m_Items.size() && m_Items[i].size == 0)
+            position += sizeof(uint32_t);
         if (position > UINT32_MAX)
             return Fail("the pack would be larger than 4 GiB");
     }
@@ -174,6 +178,8 @@ bool CPackWriter::Emit(const Sink& sink)
                 return Fail(item.source.string() + ": cannot be read, or it changed while the pack was built");
         }
         size_t padding = static_cast<size_t>(AlignUp4(item.size) - item.size);
+        if (i + 1 == m_Items.size() && item.size == 0)
+            padding = sizeof(uint32_t);
         if (padding && !sink(kZeros, padding))
             return Fail(item.path + ": cannot write");
     }
