@@ -76,12 +76,17 @@ unsigned SearchPrefix(const PackEntry* begin, const PackEntry* end, const char* 
 
 CGamePack::CGamePack() : CGamePack(GamePackConfig{}) {}
 
-CGamePack::CGamePack(GamePackConfig config)
+void CGamePack::SetNames(const GamePackConfig& config)
 {
     m_Folder = config.folder;
     if (!m_Folder.empty() && m_Folder.back() != '/')
         m_Folder += '/';
     m_PackName = config.packFile;
+}
+
+CGamePack::CGamePack(GamePackConfig config)
+{
+    SetNames(config);
     std::string packPath = !m_PackName.empty() && m_PackName[0] == '/' ? m_PackName : m_Folder + m_PackName;
     unsigned size = 0;
     m_Data = static_cast<const uint8_t*>(sys::MapFile(packPath.c_str(), &size));
@@ -94,10 +99,7 @@ CGamePack::CGamePack(GamePackConfig config)
 
 CGamePack::CGamePack(const void* image, size_t size, GamePackConfig config)
 {
-    m_Folder = config.folder;
-    if (!m_Folder.empty() && m_Folder.back() != '/')
-        m_Folder += '/';
-    m_PackName = config.packFile;
+    SetNames(config);
     m_Data = static_cast<const uint8_t*>(image);
     m_Size = size;
     if (!m_Data || size == 0) {

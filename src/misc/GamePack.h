@@ -88,6 +88,7 @@ public:
     const void* EntryData(const PackEntry& entry) const { return m_Data + entry.offset; }
 
 private:
+    void SetNames(const GamePackConfig& config);
     void Load(GamePackConfig& config);
     bool CheckPack();
     void FindOverlay();
