@@ -1,0 +1,254 @@
+#include "misc/sys/Path.h"
+
+#include "diag/Assert.h"
+#include "misc/Unicode.h"
+#include "misc/sys/MemMap.h"
+
+#include <zlib.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <dirent.h>
+#include <filesystem>
+#include <fnmatch.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace ox::misc::sys {
+
+namespace {
+
+constexpr size_t kGzipBlock = 32768;
+
+bool IsSeparator(wchar c) { return c == u'/' || c == u'\\'; }
+
+// The wide length under the name the contract text uses.
+size_t wcslen(const wchar* text) { return WideLength(text); }
+
+// A name for the temporary file beside `path`, unique for this process.
+std::string TemporaryBeside(const std::string& path)
+{
+    return path + ".tmp" + std::to_string(getpid());
+}
+
+void AddFullAccess(const std::string& path, const struct stat& info)
+{
+    mode_t wanted = S_ISDIR(info.st_mode) ? (info.st_mode | 0777) : (info.st_mode | 0666);
+    chmod(path.c_str(), wanted & 07777);
+}
+
+} // namespace
+
+std::string NativePath(const std::string& path)
+{
+    std::string native = path;
+    std::replace(native.begin(), native.end(), '\\', '/');
+    return native;
+}
+
+std::string NativePath(const wstring& path) { return NativePath(WideToUtf8(path)); }
+
+wstring AppendPath(const wstring& first, const wstring& second)
+{
+    size_t from = 0;
+    while (from < second.size() && IsSeparator(second[from]))
+        ++from;
+    if (first.empty())
+        return second;
+    if (from == second.size())
+        return first;
+    size_t end = first.size();
+    while (end > 0 && IsSeparator(first[end - 1]))
+        --end;
+    wstring joined = end == 0 ? wstring(u"/") : first.substr(0, end) + u"/";
+    return joined + second.substr(from);
+}
+
+bool CheckExistPath(const wstring& path)
+{
+    return !path.empty() && access(NativePath(path).c_str(), F_OK) == 0;
+}
+
+wstring GetCurrentDirectory()
+{
+    std::error_code error;
+    std::filesystem::path current = std::filesystem::current_path(error);
+    return error ? wstring() : Utf8ToWide(current.string());
+}
+
+bool SetCurrentDirectory(const wstring& path)
+{
+    return !path.empty() && chdir(NativePath(path).c_str()) == 0;
+}
+
+uint32_t CalcCRC(const void* data, size_t size, uint32_t crc)
+{
+    // zlib runs the same reflected table; its inversions on entry and exit are undone here.
+    const auto* bytes = static_cast<const Bytef*>(data);
+    uLong value = ~crc & 0xFFFFFFFFu;
+    while (size > 0) {
+        uInt block = static_cast<uInt>(std::min<size_t>(size, 1u << 30));
+        value = crc32(value, bytes, block);
+        bytes += block;
+        size -= block;
+    }
+    return static_cast<uint32_t>(~value);
+}
+
+int CalcFileCRC(const wstring& path)
+{
+    unsigned size = 0;
+    const void* memory = MapFile(path.c_str(), &size);
+    if (!memory)
+        return -1;
+    uint32_t crc = CalcCRC(memory, size);
+    UnmapFile(memory);
+    return static_cast<int>(crc);
+}
+
+void SetNamedFullAccess(const wstring& path, bool inherit)
+{
+    std::string native = NativePath(path);
+    struct stat info;
+    if (native.empty() || lstat(native.c_str(), &info) != 0 || S_ISLNK(info.st_mode))
+        return;
+    AddFullAccess(native, info);
+    if (!inherit || !S_ISDIR(info.st_mode))
+        return;
+    std::error_code error;
+    for (auto it = std::filesystem::recursive_directory_iterator(native, error);
+         !error && it != std::filesystem::recursive_directory_iterator(); it.increment(error)) {
+        std::string child = it->path().string();
+        if (lstat(child.c_str(), &info) == 0 && !S_ISLNK(info.st_mode))
+            AddFullAccess(child, info);
+    }
+}
+
+bool Compress(const wstring& source, const wstring& destination)
+{
+    std::string target = NativePath(destination);
+    FILE* in = fopen(NativePath(source).c_str(), "rb");
+    if (!in)
+        return false;
+    std::string temporary = TemporaryBeside(target);
+    gzFile out = gzopen(temporary.c_str(), "wb6 ");
+    if (!out) {
+        fclose(in);
+        return false;
+    }
+    std::vector<char> block(kGzipBlock);
+    bool ok = true;
+    for (;;) {
+        size_t n = fread(block.data(), 1, block.size(), in);
+        if (n > 0 && gzwrite(out, block.data(), static_cast<unsigned>(n)) != static_cast<int>(n)) {
+            ok = false;
+            break;
+        }
+        if (n < block.size())
+            break;
+    }
+    ok = ok && !ferror(in) && feof(in);
+    fclose(in);
+    ok = gzclose(out) == Z_OK && ok;
+    ok = ok && rename(temporary.c_str(), target.c_str()) == 0;
+    if (!ok)
+        remove(temporary.c_str());
+    return ok;
+}
+
+bool Uncompress(const wstring& source, const wstring& destination)
+{
+    std::string target = NativePath(destination);
+    gzFile in = gzopen(NativePath(source).c_str(), "rb");
+    if (!in)
+        return false;
+    std::string temporary = TemporaryBeside(target);
+    FILE* out = fopen(temporary.c_str(), "wb");
+    if (!out) {
+        gzclose(in);
+        return false;
+    }
+    std::vector<char> block(kGzipBlock);
+    bool ok = true;
+    for (;;) {
+        int n = gzread(in, block.data(), static_cast<unsigned>(block.size()));
+        if (n < 0) {
+            ok = false;
+            break;
+        }
+        if (n > 0 && fwrite(block.data(), 1, static_cast<size_t>(n), out) != static_cast<size_t>(n)) {
+            ok = false;
+            break;
+        }
+        if (n == 0)
+            break;
+    }
+    int error = Z_OK;
+    gzerror(in, &error);
+    ok = ok && error == Z_OK;
+    // A stream cut short is reported again by the close.
+    ok = gzclose(in) == Z_OK && ok;
+    ok = fclose(out) == 0 && ok;
+    ok = ok && rename(temporary.c_str(), target.c_str()) == 0;
+    if (!ok)
+        remove(temporary.c_str());
+    return ok;
+}
+
+void ListFiles(std::vector<wstring>& _list, const wchar* _path_and_name_of_folder)
+{
+    OX_ASSERT(wcslen(_path_and_name_of_folder)<500);
+    wstring path(_path_and_name_of_folder);
+    std::replace(path.begin(), path.end(), u'\\', u'/');
+    size_t cut = path.rfind(u'/');
+    wstring folder = cut == wstring::npos ? wstring() : path.substr(0, cut + 1);
+    std::string pattern = WideToUtf8(cut == wstring::npos ? path : path.substr(cut + 1));
+
+    DIR* dir = opendir(folder.empty() ? "." : WideToUtf8(folder).c_str());
+    if (!dir)
+        return;
+    std::vector<std::string> names;
+    while (const dirent* entry = readdir(dir)) {
+        std::string name = entry->d_name;
+        if (name == "." || name == "..")
+            continue;
+        if (fnmatch(pattern.c_str(), name.c_str(), FNM_CASEFOLD) == 0)
+            names.push_back(name);
+    }
+    closedir(dir);
+    std::sort(names.begin(), names.end());
+    for (const std::string& name : names)
+        _list.push_back(folder + Utf8ToWide(name));
+}
+
+bool RemoveLastPathPart(wchar* _path)
+{
+    size_t length = WideLength(_path);
+    if (length <= 1 || IsSeparator(_path[length - 1]))
+        return false;
+    size_t i = length - 1;
+    while (i > 0 && !IsSeparator(_path[i]))
+        --i;
+    _path[i] = 0;
+    return true;
+}
+
+bool RemoveLastPathPart(wstring& _path)
+{
+    if (!RemoveLastPathPart(_path.data()))
+        return false;
+    _path.resize(WideLength(_path.c_str()));
+    return true;
+}
+
+bool CreateFolder(const wstring& path)
+{
+    if (path.empty())
+        return false;
+    std::error_code error;
+    std::filesystem::path native(NativePath(path));
+    std::filesystem::create_directories(native, error);
+    return std::filesystem::is_directory(native, error);
+}
+
+} // namespace ox::misc::sys

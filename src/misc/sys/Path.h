@@ -1,0 +1,55 @@
+#pragma once
+// Small file and path helpers on wide paths. Wide paths are UTF-16; the file system sees
+// them as UTF-8 with "\" read as a separator.
+#include "misc/WideChar.h"
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace ox::misc::sys {
+
+// The path as the file system takes it: UTF-8, every "\" turned into "/".
+std::string NativePath(const wstring& path);
+std::string NativePath(const std::string& path);
+
+// Joins two paths with one "/" between them: separators at the end of the first part and
+// at the start of the second are dropped. An empty part gives the other one.
+wstring AppendPath(const wstring& first, const wstring& second);
+
+bool CheckExistPath(const wstring& path);
+
+// The working folder; empty if it cannot be read.
+wstring GetCurrentDirectory();
+bool SetCurrentDirectory(const wstring& path);
+
+// The file CRC of this system: the reflected CRC-32 table (polynomial 0xEDB88320) with a
+// start value of 0 and no final inversion, so not the common CRC-32.
+uint32_t CalcCRC(const void* data, size_t size, uint32_t crc = 0);
+// The CRC of a whole file, -1 if it cannot be mapped (missing or empty).
+int CalcFileCRC(const wstring& path);
+
+// Gives everyone full access: read and write for files, everything for folders. With
+// `inherit`, what a folder holds now is changed too. Failures are ignored.
+void SetNamedFullAccess(const wstring& path, bool inherit);
+
+// gzip a file into another and back, through zlib in blocks of 32768 bytes. The
+// destination is written beside itself and renamed into place, so a failure leaves an
+// existing destination as it was. True when the whole input went through without error.
+bool Compress(const wstring& source, const wstring& destination);
+bool Uncompress(const wstring& source, const wstring& destination);
+
+// Appends to `_list` folder + name for each entry of the folder of the pattern whose name
+// matches the pattern's last component ("*", "?" and sets; letter case ignored), sorted
+// by name. "." and ".." are left out.
+void ListFiles(std::vector<wstring>& _list, const wchar* _path_and_name_of_folder);
+
+// Cuts the last component in place. False, with the path unchanged, for a path of at most
+// one character or one that ends in a separator; a path without a separator becomes empty.
+bool RemoveLastPathPart(wchar* _path);
+bool RemoveLastPathPart(wstring& _path);
+
+// Creates the folder with every missing level; true if it exists as a folder afterwards.
+bool CreateFolder(const wstring& path);
+
+} // namespace ox::misc::sys
