@@ -1,0 +1,123 @@
+#pragma once
+// The settings tree: XML elements become nodes, attributes become pooled string values.
+// Element and attribute names are interned: equal names share one identifier object, so
+// names compare by address. Look-ups that find nothing return static empty objects, so that
+// calls chain without tests; the "Ref" forms return null instead.
+#include "core/SettingsValue.h"
+#include "misc/String.h"
+#include "misc/WideChar.h"
+
+#include <boost/shared_ptr.hpp>
+
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+namespace ox::core {
+
+class CSettingsGroup;
+struct SettingsLoader;
+using SettingsGroupPtrT = boost::shared_ptr<CSettingsGroup>;
+
+// The identifier of `name` (at most 87 characters), created at first sight and kept to the
+// end of the process.
+const misc::StringA88* InternId(std::string_view name);
+// The identifier of `name` if it was ever interned, else null.
+const misc::StringA88* FindId(std::string_view name);
+// The empty identifier.
+const misc::StringA88& EmptyId();
+
+class CSettingsGroup {
+public:
+    using String = misc::StringA88;
+    using Attribute = std::pair<const String*, CSettingsRefCountedConstString>;
+    using NamedChild = std::pair<const String*, SettingsGroupPtrT>;
+
+    CSettingsGroup();
+    explicit CSettingsGroup(const String& id);
+    virtual ~CSettingsGroup();
+    CSettingsGroup(const CSettingsGroup&) = delete;
+    CSettingsGroup& operator=(const CSettingsGroup&) = delete;
+
+    const String& GetId() const { return *m_Id; }
+    CSettingsGroup* GetParent() const { return m_Parent; }
+
+    // Appends; a non-empty name also enters the child among the named children.
+    void AddChild(SettingsGroupPtrT child, const String& name = EmptyId());
+    // Removes by identity; a node that is not a child is ignored.
+    void RemoveChild(const CSettingsGroup& child);
+    // Children with this name; an empty name counts all.
+    unsigned EnumChildren(const String& name = EmptyId()) const;
+
+    const CSettingsGroup& GetFirstChild() const;
+    CSettingsGroup* GetFirstChildRef() const;
+    // The first child with the name; `recursive` searches a non-matching child's subtree
+    // before going on to the next child.
+    const CSettingsGroup& GetChild(const String& name, bool recursive = false) const;
+    CSettingsGroup* GetChildRef(const String& name, bool recursive = false) const;
+    // As GetChild, and the child's attribute `attribute` must equal `value`.
+    const CSettingsGroup& GetChildByAttribute(const String& element, const String& attribute,
+                                              const std::string& value, bool recursive = false) const;
+    CSettingsGroup* GetChildByAttributeRef(const String& element, const String& attribute,
+                                           const std::string& value, bool recursive = false) const;
+    // As GetChild over the named children.
+    const CSettingsGroup& GetNamedChild(const String& name, bool recursive = false) const;
+    CSettingsGroup* GetNamedChildRef(const String& name, bool recursive = false) const;
+    // The child after this one in the parent's list; none for a node with an empty id.
+    const CSettingsGroup& GetNextSibling() const;
+    CSettingsGroup* GetNextSiblingRef() const;
+
+    // Adds an attribute; the attributes stay sorted by name, and of two equal names the one
+    // added first is found.
+    void AddValue(const String& name, const std::string& value);
+    void AddValue(const char* name, const char* value);
+    bool IsValue(const String& name) const;
+    // The value, or the empty static string.
+    const std::string& GetValue(const String& name) const;
+    unsigned EnumAttributes() const { return static_cast<unsigned>(m_Attributes.size()); }
+    // The name of attribute `index`, or the empty identifier.
+    const String& GetAttribute(unsigned index) const;
+
+    // Deep copy into `target`: its id becomes this id, copies of the children are appended,
+    // and the attributes are replaced.
+    void CopyTo(CSettingsGroup& target) const;
+
+    // All children in order, for walks over many children.
+    const std::vector<SettingsGroupPtrT>& GetChildren() const { return m_Children; }
+
+    static const CSettingsGroup& Empty();
+    static const std::string& EmptyString();
+
+private:
+    friend struct SettingsLoader;
+
+    void AddValue(const String* id, std::string_view value);
+    const CSettingsRefCountedConstString* FindValue(std::string_view name) const;
+    CSettingsGroup* FindChild(const String* id, const String* attribute, const std::string* value,
+                              bool recursive) const;
+    CSettingsGroup* FindNamedChild(const String* id, bool recursive) const;
+
+    const String* m_Id;
+    CSettingsGroup* m_Parent = nullptr;
+    std::vector<SettingsGroupPtrT> m_Children;
+    std::vector<NamedChild> m_NamedChildren;
+    std::vector<Attribute> m_Attributes;
+};
+
+// A root: an empty id, and the load operations. Each load adds the file's top-level elements
+// as new children, so several files add up.
+class CSettings : public CSettingsGroup {
+public:
+    CSettings() = default;
+
+    // Parses XML bytes held in memory; `name` names the file in log lines.
+    bool LoadXmlFromMemory(const char* data, size_t size, const std::string& name);
+    // Reads the file named on disk; a relative path is made absolute from the working folder.
+    bool LoadXmlDirect(const wstring& path);
+
+private:
+    bool Parse(const char* data, size_t size, const std::string& name);
+};
+
+} // namespace ox::core
