@@ -1,5 +1,7 @@
 #include "core/Settings.h"
 
+#include "misc/GamePack.h"
+
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "misc/Unicode.h"
@@ -399,6 +401,21 @@ bool CSettings::LoadXmlFromMemory(const char* data, size_t size, const std::stri
         return false;
     }
     return Parse(data, size, name);
+}
+
+bool CSettings::LoadXml(const std::string& path)
+{
+    OX_LOG("core", diag::LogTrace, "CSettings::LoadXml loading %s", path.c_str());
+    misc::CGamePack& pack = misc::g_GamePack::Instance();
+    unsigned size = 0;
+    const void* data = pack.Open(path.c_str(), &size);
+    if (!data) {
+        OX_LOG("core", diag::LogError, "CSettings::LoadXml failed on file %s", path.c_str());
+        return false;
+    }
+    bool result = Parse(static_cast<const char*>(data), size, path);
+    pack.Close(data);
+    return result;
 }
 
 bool CSettings::LoadXmlDirect(const wstring& path)

@@ -111,6 +111,8 @@ class CSettings : public CSettingsGroup {
 public:
     CSettings() = default;
 
+    // Reads the file through the game pack.
+    bool LoadXml(const std::string& path);
     // Parses XML bytes held in memory; `name` names the file in log lines.
     bool LoadXmlFromMemory(const char* data, size_t size, const std::string& name);
     // Reads the file named on disk; a relative path is made absolute from the working folder.

@@ -1,5 +1,7 @@
 #include "core/SettingsReaders.h"
 
+#include "misc/StringTable.h"
+
 #include "misc/Unicode.h"
 
 #include <boost/lexical_cast.hpp>
@@ -52,6 +54,11 @@ wstring ReadWString(const CSettingsGroup& group, const SettingsName& name)
     return misc::ConvertToWide(group.GetValue(name));
 }
 
+wstring ReadLocalText(const CSettingsGroup& group, const SettingsName& name)
+{
+    return misc::CStringTable::Instance().FormatByStringsID(group.GetValue(name));
+}
+
 namespace {
 
 template <class T, class Reader>
@@ -93,6 +100,11 @@ bool ReadColor(const CSettingsGroup& group, const SettingsName& name, graphics::
 bool ReadWString(const CSettingsGroup& group, const SettingsName& name, wstring& value)
 {
     return ReadIfPresent(group, name, value, [](auto& g, auto& n) { return ReadWString(g, n); });
+}
+
+bool ReadLocalText(const CSettingsGroup& group, const SettingsName& name, wstring& value)
+{
+    return ReadIfPresent(group, name, value, [](auto& g, auto& n) { return ReadLocalText(g, n); });
 }
 
 } // namespace ox::core

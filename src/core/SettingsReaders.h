@@ -26,12 +26,16 @@ graphics::Color ReadColor(const CSettingsGroup& group, const SettingsName& name)
 // The value converted to wide text.
 wstring ReadWString(const CSettingsGroup& group, const SettingsName& name);
 
+// The value with its "$<id>" references replaced from the string table.
+wstring ReadLocalText(const CSettingsGroup& group, const SettingsName& name);
+
 bool ReadBool(const CSettingsGroup& group, const SettingsName& name, bool& value);
 bool ReadInt(const CSettingsGroup& group, const SettingsName& name, int& value);
 bool ReadFloat(const CSettingsGroup& group, const SettingsName& name, float& value);
 bool ReadVector(const CSettingsGroup& group, const SettingsName& name, misc::Vector<float>& value);
 bool ReadColor(const CSettingsGroup& group, const SettingsName& name, graphics::Color& value);
 bool ReadWString(const CSettingsGroup& group, const SettingsName& name, wstring& value);
+bool ReadLocalText(const CSettingsGroup& group, const SettingsName& name, wstring& value);
 
 // The same rules on a bare value text.
 int ParseSettingsInt(const std::string& text);

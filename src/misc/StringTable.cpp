@@ -2,11 +2,15 @@
 
 #include "diag/Log.h"
 #include "diag/Message.h"
+#include "misc/ChunkBuffer.h"
+#include "misc/GamePack.h"
 #include "misc/Unicode.h"
+#include "misc/XmlParser.h"
 
 #include <algorithm>
 #include <cstdio>
 #include <cstring>
+#include <strings.h>
 
 namespace ox::misc {
 
@@ -30,6 +34,84 @@ void WriteU32(std::vector<uint8_t>& out, size_t at, uint32_t v) { memcpy(out.dat
 
 CStringTable::~CStringTable() { Release(); }
 
+void CStringTable::Load() { Load(g_GamePack::Instance()); }
+
+void CStringTable::Load(CGamePack& pack)
+{
+    Release();
+    for (const char* path : {"properties/strings.bindump", "properties/strings.xml.bin_utf16le"}) {
+        unsigned size = 0;
+        const void* data = pack.Open(path, &size);
+        if (!data)
+            continue;
+        if (UseTable(static_cast<const uint8_t*>(data), size, path)) {
+            m_PackHandle = data;
+            m_Pack = &pack;
+            return;
+        }
+        diag::message::Show("Error", "strings.bindump is corrupted or contains wrong encoding.");
+        pack.Close(data);
+        break;
+    }
+    unsigned size = 0;
+    const void* xml = pack.Open("properties/strings.xml", &size);
+    if (!xml) {
+        OX_LOG("StringTable", diag::LogError, "Failed to load StringTable data");
+        return;
+    }
+    std::vector<std::pair<int, wstring>> texts;
+    ParseXml(static_cast<const char*>(xml), size, "properties/strings.xml", texts);
+    pack.Close(xml);
+    BuildFromTexts(std::move(texts));
+}
+
+namespace {
+
+struct XmlLoad {
+    int currentId = -1;
+    ChunkBuffer chunks;
+    std::vector<std::pair<int, const wchar*>> entries;
+};
+
+void OnStringAttribute(void* user, XmlRecord*, int, const char* name, size_t nameLength, const char* value,
+                       size_t valueLength, bool)
+{
+    if (nameLength != 2 || strncasecmp(name, "id", 2) != 0)
+        return;
+    StringA88 id(std::string_view(value, std::min<size_t>(valueLength, 87)));
+    static_cast<XmlLoad*>(user)->currentId = atoi(id.c_str());
+}
+
+void OnStringText(void* user, XmlRecord* stack, int depth, bool)
+{
+    auto* load = static_cast<XmlLoad*>(user);
+    if (load->currentId == -1)
+        return;
+    const XmlRecord& record = stack[depth];
+    wstring text = Utf8ToWide(std::string_view(record.text, record.textLength));
+    size_t bytes = (text.size() + 1) * sizeof(wchar);
+    auto* copy = static_cast<wchar*>(load->chunks.Allocate(32768, bytes));
+    memcpy(copy, text.c_str(), bytes);
+    load->entries.emplace_back(load->currentId, copy);
+    load->currentId = -1;
+}
+
+} // namespace
+
+bool CStringTable::ParseXml(const char* data, size_t size, const std::string& name,
+                            std::vector<std::pair<int, wstring>>& texts)
+{
+    XmlLoad load;
+    XmlParseProblem problem;
+    bool ok = misc::ParseXml(data, size, &load, nullptr, OnStringAttribute, nullptr, nullptr, OnStringText, &problem);
+    if (!ok || !problem.what.empty())
+        OX_LOG("StringTable", diag::LogError, "%s line %u: %s", name.c_str(), problem.line,
+               problem.what.empty() ? "not an XML file" : problem.what.c_str());
+    for (const auto& [id, text] : load.entries)
+        texts.emplace_back(id, text);
+    return ok && problem.what.empty();
+}
+
 CStringTable& CStringTable::Instance()
 {
     static CStringTable* instance = new CStringTable();
@@ -40,6 +122,10 @@ void CStringTable::Release()
 {
     if (m_Owned)
         delete[] m_Table;
+    if (m_PackHandle)
+        m_Pack->Close(m_PackHandle);
+    m_PackHandle = nullptr;
+    m_Pack = nullptr;
     m_Table = nullptr;
     m_Size = 0;
     m_Owned = false;

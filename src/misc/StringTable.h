@@ -22,6 +22,7 @@ public:
     // properties/strings.bindump, else properties/strings.xml.bin_utf16le, else
     // properties/strings.xml, all through the game pack.
     void Load();
+    void Load(class CGamePack& pack);
 
     const wchar* GetString(int id) const;
     wstring FormatByStringsID(const wstring& text) const;
@@ -55,6 +56,7 @@ private:
     size_t m_Size = 0;
     bool m_Owned = false;
     const void* m_PackHandle = nullptr; // what the game pack gave, to close it
+    class CGamePack* m_Pack = nullptr;
 };
 
 // A text with its "$" references, and its expansion kept up to date.

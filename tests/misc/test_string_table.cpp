@@ -86,3 +86,73 @@ TEST(StringTable, BinaryDumpsRoundTrip)
     memcpy(&ch, utf32.data() + offset + 4, 4);
     EXPECT_EQ(ch, 0u);
 }
+
+#include "misc/GamePack.h"
+#include "misc/PackWriter.h"
+
+namespace {
+// A pack image aligned for in-place reading.
+struct PackImage {
+    std::vector<uint32_t> words;
+    size_t size = 0;
+    explicit PackImage(ox::misc::CPackWriter& writer)
+    {
+        std::string image;
+        EXPECT_TRUE(writer.Build(image));
+        size = image.size();
+        words.resize((size + 3) / 4);
+        memcpy(words.data(), image.data(), size);
+    }
+};
+ox::misc::GamePackConfig NoLanguage(const oxtest::TempDir& dir)
+{
+    ox::misc::GamePackConfig config;
+    config.folder = dir.Path().string();
+    config.language = "";
+    return config;
+}
+} // namespace
+
+TEST(StringTable, LoadPrefersTheBindumpAndUsesItInPlace)
+{
+    oxtest::TempDir dir;
+    ox::misc::CPackWriter writer;
+    std::vector<uint8_t> bindump = CStringTable::BuildBinary16(Sample(), "S16\x01");
+    writer.AddData("properties/strings.bindump", std::string(bindump.begin(), bindump.end()));
+    writer.AddData("properties/strings.xml", "<?xml version=\"1.0\"?><s><t id=\"5\">from xml</t></s>");
+    PackImage image(writer);
+    ox::misc::CGamePack pack(image.words.data(), image.size, NoLanguage(dir));
+
+    CStringTable table;
+    table.Load(pack);
+    const auto* text = reinterpret_cast<const uint8_t*>(table.GetString(5));
+    const auto* base = reinterpret_cast<const uint8_t*>(image.words.data());
+    EXPECT_EQ(wstring(table.GetString(5)), u"five");
+    EXPECT_TRUE(text > base && text < base + image.size) << "the table is read inside the pack";
+}
+
+TEST(StringTable, WrongMagicShowsTheBoxAndFallsBackToXml)
+{
+    oxtest::TempDir dir;
+    oxtest::LogCapture log;
+    oxtest::MessageCapture boxes;
+    dir.Write("properties/strings.xml.bin_utf16le", "S16Xjunk");
+    dir.Write("properties/strings.xml",
+              "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<strings>\n"
+              "<s id=\"5\">Hello &amp; bye</s>\n<s id=\"1\"/>\n<s>\xD0\x96</s>\n<s ID=\"3\">three</s>\n</strings>\n");
+    ox::misc::CGamePack pack(NoLanguage(dir));
+    CStringTable table;
+    table.Load(pack);
+    ASSERT_EQ(boxes.Boxes().size(), 1u);
+    EXPECT_EQ(boxes.Boxes()[0].caption, "Error");
+    EXPECT_EQ(boxes.Boxes()[0].text, "strings.bindump is corrupted or contains wrong encoding.");
+    EXPECT_EQ(wstring(table.GetString(5)), u"Hello & bye");
+    EXPECT_EQ(wstring(table.GetString(1)), u"\u0416") << "an id without text waits for the next text";
+    EXPECT_EQ(wstring(table.GetString(3)), u"three") << "the id attribute ignores case";
+
+    ox::misc::CGamePack empty(NoLanguage(oxtest::TempDir()));
+    CStringTable none;
+    none.Load(empty);
+    EXPECT_FALSE(none.HasTable());
+    EXPECT_TRUE(log.Contains("[StringTable][3]: Failed to load StringTable data"));
+}
