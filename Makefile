@@ -22,8 +22,8 @@ test: build
 	@cd $(BUILD_DIR) && ctest --output-on-failure $(CTEST_ARGS)
 
 run: build
-	@if [ -x $(BUILD_DIR)/src/game/k17 ]; then \
-		cd games/demo && exec ../../$(BUILD_DIR)/src/game/k17; \
+	@if [ -x $(BUILD_DIR)/src/k17 ]; then \
+		cd games/demo && exec ../../$(BUILD_DIR)/src/k17; \
 	else \
 		echo "make run: the game executable k17 is not built yet (the application spine comes next)"; \
 		exit 1; \

@@ -2,17 +2,15 @@
 // The interface between the application and the operating system: one window, one
 // message loop, the mouse cursor and the screen geometry.
 #include "core/platform/Event.h"
+#include "misc/Rect.h"
+#include "misc/Vector.h"
 
 #include <string>
 
 namespace ox::core {
 
-struct IntRect {
-    int X = 0, Y = 0, Width = 0, Height = 0;
-};
-struct IntPoint {
-    int X = 0, Y = 0;
-};
+using misc::IntRect;
+using IntPoint = misc::IntVector;
 
 // What the loop calls back: the application.
 class IPlatformClient {
@@ -50,6 +48,14 @@ public:
     virtual unsigned GetCursorType() = 0;
     virtual void ShowCursor(bool show) = 0;
     virtual bool IsCursorVisible() = 0;
+    // Confines the mouse to a rectangle of the window's client area; null frees it.
+    virtual void ClipCursor(const IntRect* clientRect) = 0;
+
+    // Who the loop calls back, and the names the single-instance lock and the window use
+    // (the lock lives in the user's data folder of the game).
+    virtual void SetClient(IPlatformClient* client) = 0;
+    virtual void SetIdentity(const std::string& product, const std::string& windowTitle,
+                             const std::string& lockFolder) = 0;
 };
 
 } // namespace ox::core

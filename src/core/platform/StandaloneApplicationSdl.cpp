@@ -74,6 +74,7 @@ bool CStandaloneApplicationSdl::CheckSingleInstance()
     sockaddr_un address = NotifyAddress(lockPath, length);
     if (flock(fd, LOCK_EX | LOCK_NB) != 0) {
         close(fd);
+        m_SecondInstance = true;
         // Another instance holds the lock: ask it to come to the front.
         int sock = socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
         if (sock >= 0) {
@@ -264,6 +265,18 @@ void CStandaloneApplicationSdl::ApplyCursor()
             SDL_SetCursor(m_Cursors[m_CursorType]);
     }
     SDL_ShowCursor(m_CursorVisible ? SDL_ENABLE : SDL_DISABLE);
+}
+
+void CStandaloneApplicationSdl::ClipCursor(const IntRect* clientRect)
+{
+    if (!m_Wnd)
+        return;
+    if (!clientRect) {
+        SDL_SetWindowMouseRect(m_Wnd, nullptr);
+        return;
+    }
+    SDL_Rect rect {clientRect->X, clientRect->Y, clientRect->Width, clientRect->Height};
+    SDL_SetWindowMouseRect(m_Wnd, &rect);
 }
 
 TranslationState CStandaloneApplicationSdl::CurrentState() const

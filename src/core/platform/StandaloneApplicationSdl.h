@@ -18,8 +18,9 @@ public:
 
     // Who the loop calls, and the names the lock and the window use. The lock file lives
     // in lockFolder (the user's data folder of the game).
-    void SetClient(IPlatformClient* client) { m_Client = client; }
-    void SetIdentity(const std::string& product, const std::string& windowTitle, const std::string& lockFolder);
+    void SetClient(IPlatformClient* client) override { m_Client = client; }
+    void SetIdentity(const std::string& product, const std::string& windowTitle,
+                     const std::string& lockFolder) override;
 
     bool Init() override;
     void Run() override;
@@ -43,9 +44,12 @@ public:
     unsigned GetCursorType() override { return m_CursorType; }
     void ShowCursor(bool show) override;
     bool IsCursorVisible() override { return m_CursorVisible; }
+    void ClipCursor(const IntRect* clientRect) override;
 
     SDL_Window* GetWindow() const { return m_Wnd; }
     bool IsStopRequested() const { return m_StopRequested; }
+    // The last CheckSingleInstance found another instance running.
+    bool IsSecondInstance() const { return m_SecondInstance; }
     // Handles one record as the window procedure would: the platform's own messages here,
     // the rest to the client.
     uint32_t Dispatch(const SystemEvent& event);
@@ -77,6 +81,7 @@ private:
     std::string m_LockFolder;
     int m_LockFd = -1;
     int m_NotifySocket = -1;
+    bool m_SecondInstance = false;
 };
 
 } // namespace ox::core

@@ -1,0 +1,382 @@
+#include "core/Application.h"
+
+#include "core/SettingsReaders.h"
+#include "core/TimeManager.h"
+#include "diag/Assert.h"
+#include "diag/Log.h"
+#include "misc/StringTable.h"
+#include "misc/Unicode.h"
+#include "misc/sys/Path.h"
+
+#include <chrono>
+#include <cstdlib>
+#include <thread>
+
+namespace ox::core {
+
+CApplication* g_Application = nullptr;
+
+wstring CApplication::UserDataFolder(const wstring& company, const wstring& product)
+{
+    std::string base;
+    const char* xdg = getenv("XDG_DATA_HOME");
+    if (xdg && *xdg) {
+        base = xdg;
+    } else {
+        const char* home = getenv("HOME");
+        base = std::string(home && *home ? home : ".") + "/.local/share";
+    }
+    return misc::sys::AppendPath(misc::sys::AppendPath(misc::ConvertToWide(base), company), product);
+}
+
+CApplication::CApplication()
+{
+    // The first use of the time manager creates it.
+    srand(static_cast<unsigned>(GetTimeManager().GetTime()));
+    g_Application = this;
+
+    // The first use of the string table opens the game pack.
+    misc::CStringTable::Instance().Load();
+
+    m_Settings.LoadXml("game.xml");
+    const CSettingsGroup& settings = m_Settings.GetChild("settings");
+    ReadInt(settings, "debug", m_DebugLevel);
+    ReadLocalText(settings, "company", m_Company);
+    ReadLocalText(settings, "product", m_Product);
+    ReadInt(settings, "version", m_Version);
+    ReadWString(settings, "full_version", m_FullVersion);
+    ReadLocalText(settings, "window_title", m_WindowTitle);
+    if (m_WindowTitle.empty()) {
+        m_WindowTitle = m_Product + u" ";
+        if (!m_FullVersion.empty())
+            m_WindowTitle += m_FullVersion;
+        else
+            m_WindowTitle += misc::FormatWide(u"%i.%i", m_Version / 100, m_Version % 100);
+    }
+
+    m_AppDataFolder = UserDataFolder(m_Company, m_Product);
+    if (!misc::sys::CheckExistPath(m_AppDataFolder)) {
+        misc::sys::CreateFolder(m_AppDataFolder);
+        wstring companyFolder = m_AppDataFolder;
+        misc::sys::RemoveLastPathPart(companyFolder);
+        misc::sys::SetNamedFullAccess(companyFolder, true);
+    }
+
+    diag::Log::Instance().SetFile(misc::WideToUtf8(m_AppDataFolder) + "/log.oxlog");
+    OX_LOG("app", diag::LogInfo, "app created");
+}
+
+CApplication::~CApplication()
+{
+    DoShutdown();
+    OX_LOG("app", diag::LogInfo, "app destroyed");
+    diag::Log::Instance().Flush();
+    if (g_Application == this)
+        g_Application = nullptr;
+}
+
+void CApplication::SetSystemIntegration(CSystemIntegration* adapter)
+{
+    m_SystemIntegration = adapter;
+    m_Renderer.SetSystemIntegration(adapter);
+    if (adapter) {
+        adapter->SetClient(this);
+        adapter->SetIdentity(misc::WideToUtf8(m_Product), misc::WideToUtf8(m_WindowTitle),
+                             misc::WideToUtf8(m_AppDataFolder));
+    }
+}
+
+bool CApplication::Init()
+{
+    OX_LOG("app", diag::LogInfo, "app init...");
+    OX_ASSERT(m_SystemIntegration != 0 && "System Integration Adapter should be set before CApplication::Init()");
+    if (!m_SystemIntegration)
+        return false;
+    bool allOnDemand = true;
+    ReadBool(m_Settings.GetChild("settings"), "all_on_demand", allOnDemand);
+    if (!m_SystemIntegration->CheckSingleInstance())
+        return false;
+    if (!m_SystemIntegration->Init()) {
+        OX_LOG("app", diag::LogError, "error in m_SystemIntegration->Init");
+        return false;
+    }
+    // The display modes can be listed once the platform layer is up.
+    m_Renderer.EnumResolutions();
+    OX_LOG("app", diag::LogInfo, "app init complete...");
+    return true;
+}
+
+void CApplication::Run()
+{
+    if (m_SystemIntegration)
+        m_SystemIntegration->Run();
+}
+
+void CApplication::Stop()
+{
+    OnStop();
+    if (m_SystemIntegration)
+        m_SystemIntegration->Stop();
+}
+
+void CApplication::Load()
+{
+    OX_LOG("app", diag::LogInfo, "loading...");
+    m_State = Loading;
+    DoLoad();
+    if (m_State != ShuttingDown)
+        m_State = Running;
+    OX_LOG("app", diag::LogInfo, "loading complete");
+}
+
+void CApplication::DoLoad()
+{
+    OX_LOG("app", diag::LogTrace, "CApplication::DoLoad() start");
+    OX_LOG("app", diag::LogTrace, "CApplication::DoLoad() end");
+}
+
+void CApplication::Update()
+{
+    if (!IsActive()) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+        if (m_State != Loading && m_State != LoadingPaused)
+            return;
+    }
+    m_FrameLimiter.Wait();
+    GetTimeManager().Update();
+    DoUpdate();
+    if (m_ShutdownRequested)
+        DoShutdown();
+}
+
+void CApplication::Draw()
+{
+    if (!m_Minimized)
+        m_Renderer.CheckModeRestore();
+    if (m_ShutdownDone || m_Minimized || !m_Focused)
+        return;
+    if (!m_Renderer.BeginScene())
+        return;
+    DoDraw(&m_Renderer);
+    m_Renderer.EndScene();
+}
+
+void CApplication::DoDraw(graphics::CRenderer* /*renderer*/) {}
+
+void CApplication::Forward()
+{
+    if (m_SystemIntegration)
+        m_SystemIntegration->DefaultProcess();
+}
+
+void CApplication::ProcessEvent()
+{
+    SystemEvent* event = m_SystemIntegration->GetCurrentEvent();
+    if (m_ShutdownDone) {
+        m_SystemIntegration->DefaultProcess();
+        return;
+    }
+    switch (event->message) {
+    case WM_MOVE:
+        if (!m_Renderer.IsFullscreen())
+            ApplyCursorClip();
+        break;
+    case WM_SIZE: {
+        bool minimized = event->wParam == SIZE_MINIMIZED;
+        if (minimized != m_Minimized) {
+            m_Minimized = minimized;
+            if (minimized && !m_MediaPaused) {
+                if (m_MediaHooks.audio)
+                    m_MediaHooks.audio(true);
+                m_MediaPaused = true;
+            } else if (!minimized && m_MediaPaused) {
+                if (m_MediaHooks.audio)
+                    m_MediaHooks.audio(false);
+                m_MediaPaused = false;
+            }
+        }
+        UpdateActivity();
+        break;
+    }
+    case WM_CLOSE:
+    case WM_QUIT:
+    case WM_ENDSESSION:
+        Stop();
+        break;
+    case WM_ACTIVATEAPP:
+        m_Focused = event->wParam != 0;
+        UpdateActivity();
+        break;
+    case WM_SETCURSOR:
+        event->result = 1;
+        break;
+    default:
+        break;
+    }
+    Forward();
+}
+
+void CApplication::UpdateActivity()
+{
+    bool wanted = m_Focused && !m_Minimized;
+    if (wanted == m_Active)
+        return;
+    m_Active = wanted;
+    if (!(m_State == Loading && !m_Active))
+        GetTimeManager().Pause(!m_Active);
+    if (m_Active) {
+        if (m_State == LoadingPaused)
+            m_State = Loading;
+        ApplyCursorClip();
+        if (m_MediaPaused) {
+            if (m_MediaHooks.audio)
+                m_MediaHooks.audio(false);
+            if (m_MediaHooks.video)
+                m_MediaHooks.video(false);
+            m_MediaPaused = false;
+        }
+    } else {
+        if (m_Renderer.IsFullscreen() && m_State == Loading)
+            m_State = LoadingPaused;
+        if (m_SystemIntegration) {
+            m_SystemIntegration->ClipCursor(nullptr);
+            m_SystemIntegration->ShowCursor(true);
+        }
+        if (!m_MediaPaused) {
+            if (m_MediaHooks.audio)
+                m_MediaHooks.audio(true);
+            if (m_MediaHooks.video)
+                m_MediaHooks.video(true);
+            m_MediaPaused = true;
+        }
+    }
+    OnActivate(m_Active);
+}
+
+void CApplication::SetCursorClip(bool enabled, const misc::IntRect& rect)
+{
+    m_CursorClipEnabled = enabled;
+    m_CursorClipRect = rect;
+    if (enabled)
+        ApplyCursorClip();
+    else if (m_SystemIntegration)
+        m_SystemIntegration->ClipCursor(nullptr);
+}
+
+void CApplication::ApplyCursorClip()
+{
+    if (!m_CursorClipEnabled || !m_SystemIntegration)
+        return;
+    // Source rectangle to window pixels: the platform confines the mouse in client coordinates.
+    misc::FloatVector k = m_Renderer.GetScale();
+    misc::FloatVector offset = m_Renderer.GetAspectOffset();
+    misc::IntRect rect;
+    rect.X = static_cast<int>(m_CursorClipRect.X * k.X + offset.X);
+    rect.Y = static_cast<int>(m_CursorClipRect.Y * k.Y + offset.Y);
+    rect.Width = static_cast<int>(m_CursorClipRect.Width * k.X);
+    rect.Height = static_cast<int>(m_CursorClipRect.Height * k.Y);
+    m_SystemIntegration->ClipCursor(&rect);
+}
+
+bool CApplication::ChangeScreenMode(bool fullscreen, bool bpp32, unsigned width, unsigned height)
+{
+    const unsigned oldWidth = m_Renderer.GetWidth();
+    const unsigned oldHeight = m_Renderer.GetHeight();
+    const bool oldBpp32 = m_Renderer.Is32BPP();
+    const bool oldFullscreen = m_Renderer.IsFullscreen();
+
+    if (width == 0 || height == 0) {
+        m_SystemIntegration->GetDesktopResolution(&width, &height);
+        bpp32 = true;
+        fullscreen = true;
+    }
+    if (fullscreen) {
+        graphics::ResolutionsT modes;
+        m_Renderer.GetAvailableResolutions(modes);
+        bool exact = false;
+        bool otherDepth = false;
+        for (const graphics::Resolution& mode : modes) {
+            bool sizeMatches = (mode.Width == width && mode.Height == height) ||
+                               (mode.Width == height && mode.Height == width);
+            if (!sizeMatches)
+                continue;
+            if (mode.Bpp32 == bpp32) {
+                exact = true;
+                break;
+            }
+            otherDepth = true;
+        }
+        if (!exact && !otherDepth && !modes.empty()) {
+            width = modes.back().Width;
+            height = modes.back().Height;
+            bpp32 = modes.back().Bpp32;
+        } else if (!exact && otherDepth) {
+            bpp32 = !bpp32;
+        }
+    }
+    GetTimeManager().Pause(true);
+    if (oldFullscreen && !fullscreen)
+        m_Renderer.ReleaseDevice(false);
+    if (!fullscreen) {
+        misc::IntRect outer {0, 0, static_cast<int>(width), static_cast<int>(height)};
+        m_SystemIntegration->AdjustRect(outer);
+        const float dpiX = 1.0f, dpiY = 1.0f; // no DPI scaling on this platform
+        int outerWidth = static_cast<int>(outer.Width * dpiX);
+        int outerHeight = static_cast<int>(outer.Height * dpiY);
+        width = static_cast<unsigned>(width * dpiX);
+        height = static_cast<unsigned>(height * dpiY);
+        misc::IntRect work = m_SystemIntegration->GetWorkArea();
+        if (work.Width > 0 && work.Height > 0 && (outerWidth > work.Width || outerHeight > work.Height)) {
+            int frameWidth = outerWidth - static_cast<int>(width);
+            int frameHeight = outerHeight - static_cast<int>(height);
+            width = static_cast<unsigned>(work.Width - frameWidth - static_cast<int>(15 * dpiX));
+            height = static_cast<unsigned>(work.Height - frameHeight - static_cast<int>(15 * dpiY));
+        }
+        misc::IntVector source = m_Renderer.GetSourceResolution();
+        OX_ASSERT(width && height);
+        OX_ASSERT(source.X && source.Y);
+        if (width && height && source.X && source.Y) {
+            // The aspect fit runs whether or not the window had to shrink.
+            float a = static_cast<float>(width) / static_cast<float>(height);
+            float s = static_cast<float>(source.X) / static_cast<float>(source.Y);
+            if (a - s > 0.01f)
+                width = static_cast<unsigned>(width * s / a);
+            else if (a - s < 0.01f)
+                height = static_cast<unsigned>(height * a / s);
+        }
+    }
+    OX_LOG("app", diag::LogInfo, "change screen mode...");
+    bool changed = false;
+    if (OnChangeScreenMode(fullscreen, bpp32, width, height) &&
+        m_SystemIntegration->SetScreenMode(fullscreen, bpp32, width, height) &&
+        m_Renderer.InitWindow(fullscreen, bpp32, width, height)) {
+        changed = m_Renderer.GetWidth() != oldWidth || m_Renderer.GetHeight() != oldHeight ||
+                  m_Renderer.Is32BPP() != oldBpp32 || m_Renderer.IsFullscreen() != oldFullscreen;
+        if (changed)
+            OX_LOG("app", diag::LogInfo, "screen mode changed");
+    }
+    GetTimeManager().Pause(false);
+    m_Minimized = false;
+    UpdateActivity();
+    ApplyCursorClip();
+    OX_LOG("app", diag::LogInfo, "change screen mode complete");
+    return changed;
+}
+
+void CApplication::DoShutdown()
+{
+    if (m_ShutdownDone)
+        return;
+    OX_LOG("app", diag::LogTrace, "shutdown...");
+    m_State = ShuttingDown;
+    m_Renderer.ReleaseDevice(false);
+    if (m_SystemIntegration)
+        m_SystemIntegration->Shutdown();
+    if (m_SystemIntegration)
+        m_SystemIntegration->ClipCursor(nullptr);
+    LimitFPS(0);
+    m_ShutdownDone = true;
+    OX_LOG("app", diag::LogInfo, "shutdown complete...");
+}
+
+} // namespace ox::core

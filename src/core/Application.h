@@ -1,0 +1,112 @@
+#pragma once
+// The framework's application object: owns the settings, the declarations and the renderer,
+// runs one frame at a time for the platform loop, follows focus and minimising, and changes
+// the screen mode. A game derives from it.
+#include "core/Declaration.h"
+#include "core/FrameLimiter.h"
+#include "core/Settings.h"
+#include "core/SystemIntegration.h"
+#include "graphics/Renderer.h"
+#include "misc/WideChar.h"
+
+#include <functional>
+
+namespace ox::core {
+
+enum AppState : uint32_t { Created = 0, Loading = 1, LoadingPaused = 2, Running = 3, ShuttingDown = 4 };
+enum DebugLevel : int { DebugNone = 0, DebugCheats = 1, DebugLight = 2, DebugHeavy = 3 };
+
+// Media that pause while the application is in the background. Audio and video register
+// here as they exist; nothing is registered by the framework itself.
+struct MediaPauseHooks {
+    std::function<void(bool pause)> audio;
+    std::function<void(bool pause)> video;
+};
+
+class CApplication : public IPlatformClient {
+public:
+    CApplication();
+    ~CApplication() override;
+    CApplication(const CApplication&) = delete;
+    CApplication& operator=(const CApplication&) = delete;
+
+    virtual bool Init();
+    virtual void DoShutdown();
+    virtual void OnStop() {}
+    void ProcessEvent() override;
+    virtual bool OnChangeScreenMode(bool /*fullscreen*/, bool /*bpp32*/, unsigned /*width*/, unsigned /*height*/)
+    {
+        return true;
+    }
+    virtual void OnActivate(bool /*active*/) {}
+    virtual void DoDraw(graphics::CRenderer* renderer);
+    virtual void DoUpdate() {}
+    virtual void DoLoad();
+
+    void Update() override;
+    void Draw() override;
+
+    void Run();
+    void Stop();
+    void Shutdown() { m_ShutdownRequested = true; }
+    void Load();
+    void LimitFPS(unsigned fps) { m_FrameLimiter.SetFps(fps); }
+    bool ChangeScreenMode(bool fullscreen, bool bpp32, unsigned width, unsigned height);
+    void SetCursorClip(bool enabled, const misc::IntRect& rect);
+
+    CSettings& GetSettings() { return m_Settings; }
+    CResourceDeclarations& GetResourceDeclarations() { return m_ResourceDeclarations; }
+    graphics::CRenderer* GetRenderer() { return &m_Renderer; }
+    CSystemIntegration* GetSystemIntegration() const { return m_SystemIntegration; }
+    void SetSystemIntegration(CSystemIntegration* adapter);
+    int GetDebugLevel() const { return m_DebugLevel; }
+    void SetDebugLevel(int level) { m_DebugLevel = level; }
+    const wstring& GetAppDataFolder() const { return m_AppDataFolder; }
+    const wstring& GetCompany() const { return m_Company; }
+    const wstring& GetProduct() const { return m_Product; }
+    const wstring& GetWindowTitle() const { return m_WindowTitle; }
+    AppState GetState() const { return m_State; }
+    bool IsActive() const { return m_Focused && !m_Minimized; }
+    bool IsMediaPaused() const { return m_MediaPaused; }
+    bool IsShutdownDone() const { return m_ShutdownDone; }
+    const CFrameLimiter& GetFrameLimiter() const { return m_FrameLimiter; }
+    MediaPauseHooks& GetMediaPauseHooks() { return m_MediaHooks; }
+
+    // The user's data folder of a game: $XDG_DATA_HOME (or ~/.local/share), company, product.
+    static wstring UserDataFolder(const wstring& company, const wstring& product);
+
+protected:
+    void UpdateActivity();
+    void ApplyCursorClip();
+    void DrawLetterbox();
+    // Forward: the widget tree while active, then the platform's default handling.
+    void Forward();
+
+    AppState m_State = Created;
+    wstring m_Company = u"Tarnwick Loom";
+    wstring m_Product;
+    int m_Version = 0;
+    wstring m_FullVersion;
+    wstring m_WindowTitle;
+    CSettings m_Settings;
+    CResourceDeclarations m_ResourceDeclarations;
+    CSystemIntegration* m_SystemIntegration = nullptr;
+    graphics::CRenderer m_Renderer;
+    bool m_Minimized = false;
+    bool m_Focused = true;
+    bool m_Active = true;
+    bool m_MediaPaused = false;
+    int m_DebugLevel = DebugNone;
+    misc::IntRect m_CursorClipRect;
+    bool m_CursorClipEnabled = false;
+    bool m_ShutdownDone = false;
+    bool m_ShutdownRequested = false;
+    wstring m_AppDataFolder;
+    const misc::IntVector m_DefaultResolution {1024, 768};
+    CFrameLimiter m_FrameLimiter;
+    MediaPauseHooks m_MediaHooks;
+};
+
+extern CApplication* g_Application;
+
+} // namespace ox::core

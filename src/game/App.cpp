@@ -1,0 +1,128 @@
+#include "game/App.h"
+
+#include "core/SettingsReaders.h"
+#include "diag/Log.h"
+#include "misc/Unicode.h"
+#include "misc/sys/Path.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cstdio>
+
+namespace k17 {
+
+using namespace ox;
+
+namespace {
+
+unsigned g_FpsLimit = 50;
+bool g_ShowFps = false;
+wstring g_ShowFpsFont;
+
+constexpr int kSourceWidth = 1024;
+constexpr int kSourceHeight = 768;
+
+// Points a standard stream at a file in the working folder. The file is opened first, so a
+// folder that cannot be written leaves the stream where it was.
+bool Redirect(int stream, const char* file)
+{
+    int fd = open(file, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0644);
+    if (fd < 0)
+        return false;
+    fflush(stream == STDOUT_FILENO ? stdout : stderr);
+    bool ok = dup2(fd, stream) >= 0;
+    close(fd);
+    return ok;
+}
+
+} // namespace
+
+CApp::CApp() = default;
+
+CApp::~CApp()
+{
+    CloseOutput();
+    m_GameFolder.clear();
+    m_MainTimer.Reset(nullptr);
+}
+
+unsigned CApp::GetFpsLimit() { return g_FpsLimit; }
+bool CApp::IsShowFps() { return g_ShowFps; }
+
+void CApp::ReadGameFolder() { m_GameFolder = misc::sys::GetCurrentDirectory(); }
+
+void CApp::RedirectOutput()
+{
+    m_OutputRedirected = Redirect(STDOUT_FILENO, "k17_stdout.txt");
+    if (!Redirect(STDERR_FILENO, "k17_stderr.txt"))
+        OX_LOG("app", diag::LogWarning, "cannot redirect the standard error to k17_stderr.txt");
+    // Lines reach the file as they are written, as a console would show them.
+    setvbuf(stdout, nullptr, _IOLBF, 0);
+}
+
+void CApp::CloseOutput()
+{
+    if (!m_OutputRedirected)
+        return;
+    fflush(stdout);
+    fflush(stderr);
+    m_OutputRedirected = false;
+}
+
+bool CApp::Init()
+{
+    m_Adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
+    SetSystemIntegration(m_Adapter.get());
+    LimitFPS(50);
+    if (!CApplication::Init()) {
+        m_InitFailure = m_Adapter->IsSecondInstance() ? InitFailure::SecondInstance : InitFailure::Platform;
+        return false;
+    }
+    RedirectOutput();
+
+    m_MainTimer = core::GetTimeManager().AttachGroupTimer("main", nullptr);
+
+    for (const char* file : {"properties/constants.xml", "properties/effects.xml", "properties/guitemplates.xml",
+                             "properties/gui.xml"})
+        m_Settings.LoadXml(file);
+
+    wstring saves = misc::sys::AppendPath(m_AppDataFolder, u"saves");
+    if (!misc::sys::CheckExistPath(saves)) {
+        misc::sys::CreateFolder(saves);
+        misc::sys::SetNamedFullAccess(saves, false);
+    }
+
+    m_Renderer.SetSourceResolution(kSourceWidth, kSourceHeight);
+    // The window opens at the source size until the player's options choose the mode.
+    ChangeScreenMode(false, true, kSourceWidth, kSourceHeight);
+
+    const core::CSettingsGroup& settings = m_Settings.GetChild("settings");
+    g_ShowFps = false;
+    core::ReadBool(settings, "show_fps", g_ShowFps);
+    if (g_ShowFps)
+        core::ReadWString(settings, "show_fps_font", g_ShowFpsFont);
+    return true;
+}
+
+void CApp::OnStop() { CApplication::OnStop(); }
+
+void CApp::ProcessEvent()
+{
+    core::SystemEvent* event = m_SystemIntegration->GetCurrentEvent();
+    if (event->message == core::WM_KEYDOWN && m_DebugLevel >= core::DebugLight) {
+        if (event->wParam == core::VK_PRIOR && g_FpsLimit < 50)
+            g_FpsLimit += 5;
+        else if (event->wParam == core::VK_NEXT && g_FpsLimit > 5)
+            g_FpsLimit -= 5;
+        if (event->wParam == core::VK_PRIOR || event->wParam == core::VK_NEXT)
+            LimitFPS(g_FpsLimit);
+    }
+    CApplication::ProcessEvent();
+}
+
+void CApp::DoDraw(graphics::CRenderer* renderer) { CApplication::DoDraw(renderer); }
+
+void CApp::DoUpdate() { CApplication::DoUpdate(); }
+
+} // namespace k17

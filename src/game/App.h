@@ -1,0 +1,48 @@
+#pragma once
+// The game's application: creates the platform adapter, loads the game's data in order,
+// runs the per-frame script work and the debug keys.
+#include "core/Application.h"
+#include "core/TimeManager.h"
+#include "core/platform/StandaloneApplicationSdl.h"
+
+#include <cstdio>
+#include <memory>
+
+namespace k17 {
+
+class CApp : public ox::core::CApplication {
+public:
+    enum class InitFailure { None, SecondInstance, Platform };
+
+    CApp();
+    ~CApp() override;
+
+    bool Init() override;
+    void OnStop() override;
+    void ProcessEvent() override;
+    void DoDraw(ox::graphics::CRenderer* renderer) override;
+    void DoUpdate() override;
+
+    // The working folder at start: the game folder.
+    void ReadGameFolder();
+    const ox::wstring& GetGameFolder() const { return m_GameFolder; }
+    InitFailure GetInitFailure() const { return m_InitFailure; }
+    ox::core::CGroupTimer* GetMainTimer() { return m_MainTimer.Get(); }
+
+    // The frame-rate limit the debug keys move; starts at 50.
+    static unsigned GetFpsLimit();
+    static bool IsShowFps();
+
+private:
+    void RedirectOutput();
+    void CloseOutput();
+
+    ox::core::CGroupTimerWrapper m_MainTimer;
+    ox::wstring m_GameFolder;
+    // The adapter lives as long as the process, as the platform's own window would.
+    std::unique_ptr<ox::core::CStandaloneApplicationSdl> m_Adapter;
+    InitFailure m_InitFailure = InitFailure::None;
+    bool m_OutputRedirected = false;
+};
+
+} // namespace k17

@@ -1,0 +1,127 @@
+// Runs the real game executable headless on a copy of the demo game.
+#include "support/TestSupport.h"
+
+#include <signal.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <thread>
+
+namespace fs = std::filesystem;
+
+namespace {
+
+struct GameRun {
+    oxtest::TempDir dir;
+    fs::path game;
+    fs::path data;
+    pid_t pid = -1;
+
+    GameRun()
+    {
+        game = dir / "demo";
+        data = dir / "xdg";
+        fs::copy(OX_DEMO_GAME, game, fs::copy_options::recursive);
+        fs::create_directories(data);
+    }
+
+    void Start(const char* videoDriver = "offscreen")
+    {
+        pid = fork();
+        if (pid == 0) {
+            if (chdir(game.c_str()) != 0)
+                _exit(101);
+            setenv("XDG_DATA_HOME", data.c_str(), 1);
+            setenv("SDL_VIDEODRIVER", videoDriver, 1);
+            setenv("ALSOFT_DRIVERS", "null", 1);
+            execl(OX_K17_PATH, "k17", static_cast<char*>(nullptr));
+            _exit(102);
+        }
+    }
+
+    // The exit status, or -1 if the game did not end within the time.
+    int WaitExit(std::chrono::milliseconds limit)
+    {
+        auto end = std::chrono::steady_clock::now() + limit;
+        while (std::chrono::steady_clock::now() < end) {
+            int status = 0;
+            if (waitpid(pid, &status, WNOHANG) == pid) {
+                pid = -1;
+                return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
+            }
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        }
+        return -1;
+    }
+
+    std::string Log() const { return oxtest::ReadFile(data / "Lanternfold" / "Lantern Demo" / "log.oxlog"); }
+
+    ~GameRun()
+    {
+        if (pid > 0) {
+            kill(pid, SIGKILL);
+            waitpid(pid, nullptr, 0);
+        }
+    }
+};
+
+bool LogHasInOrder(const std::string& log, std::initializer_list<const char*> lines)
+{
+    size_t at = 0;
+    for (const char* line : lines) {
+        at = log.find(line, at);
+        if (at == std::string::npos)
+            return false;
+    }
+    return true;
+}
+
+} // namespace
+
+TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
+{
+    GameRun run;
+    run.Start();
+    // Let it start and run frames, then ask it to close as a desktop would.
+    for (int i = 0; i < 100 && run.Log().find("change screen mode complete") == std::string::npos; ++i)
+        std::this_thread::sleep_for(std::chrono::milliseconds(50));
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+    ASSERT_EQ(run.WaitExit(std::chrono::milliseconds(0)), -1) << "the game ended by itself:\n" << run.Log();
+
+    {
+        GameRun second;
+        second.game = run.game;
+        second.data = run.data;
+        second.Start();
+        EXPECT_EQ(second.WaitExit(std::chrono::seconds(10)), 0) << "a second instance ends quietly";
+    }
+
+    kill(run.pid, SIGTERM);
+    EXPECT_EQ(run.WaitExit(std::chrono::seconds(10)), 0);
+    std::string log = run.Log();
+    EXPECT_TRUE(LogHasInOrder(log, {"[app][1]: app created", "[app][1]: app init...", "[app][1]: app init complete...",
+                                    "[app][1]: app destroyed"}))
+        << log;
+    EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
+    EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
+}
+
+TEST(GameHeadless, NoDisplayIsAClearErrorAndANonZeroExit)
+{
+    GameRun run;
+    fs::path errors = run.dir / "stderr.txt";
+    pid_t pid = fork();
+    if (pid == 0) {
+        freopen(errors.c_str(), "w", stderr);
+        if (chdir(run.game.c_str()) != 0)
+            _exit(101);
+        setenv("XDG_DATA_HOME", run.data.c_str(), 1);
+        setenv("SDL_VIDEODRIVER", "no-such-driver", 1);
+        execl(OX_K17_PATH, "k17", static_cast<char*>(nullptr));
+        _exit(102);
+    }
+    run.pid = pid;
+    EXPECT_EQ(run.WaitExit(std::chrono::seconds(10)), 1);
+    EXPECT_NE(oxtest::ReadFile(errors).find("Cannot open a display"), std::string::npos);
+}
