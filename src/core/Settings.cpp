@@ -43,6 +43,8 @@ const StringA88* InternId(std::string_view name)
     OX_ASSERT(name.size() <= kMaxNameLength);
     if (name.size() > kMaxNameLength)
         name = name.substr(0, kMaxNameLength);
+    if (name.empty())
+        name = ""; // a fixed string must not be made from a null pointer
     auto& pool = IdPool();
     auto where = pool.find(name);
     if (where == pool.end())
@@ -226,11 +228,11 @@ const CSettingsGroup& CSettingsGroup::GetNextSibling() const
 
 void CSettingsGroup::AddValue(const String* id, std::string_view value)
 {
-    m_Attributes.emplace_back(id, CSettingsRefCountedConstString(value));
-    // Stable: of two equal names the first added stays in front, where the search lands.
-    std::stable_sort(m_Attributes.begin(), m_Attributes.end(), [](const Attribute& a, const Attribute& b) {
-        return a.first->view() < b.first->view();
-    });
+    // The vector is sorted already: inserting behind all equal names is what appending and a
+    // stable sort give. Of two equal names the first added stays in front, where the search lands.
+    auto where = std::upper_bound(m_Attributes.begin(), m_Attributes.end(), id->view(),
+                                  [](std::string_view n, const Attribute& a) { return n < a.first->view(); });
+    m_Attributes.emplace(where, id, CSettingsRefCountedConstString(value));
 }
 
 void CSettingsGroup::AddValue(const String& name, const std::string& value) { AddValue(InternId(name.view()), value); }
@@ -297,12 +299,13 @@ struct LoadContext {
         return 1 + static_cast<unsigned>(std::count(data, where, '\n'));
     }
 
-    // Names longer than an identifier holds are cut, with a line in the log.
-    std::string_view CheckedName(const char* name, size_t length) const
+    // Names longer than an identifier holds are cut, with a line in the log; `where` (in the
+    // data) gives the line.
+    std::string_view CheckedName(const char* name, size_t length, const char* where) const
     {
         if (length > kMaxNameLength) {
             OX_LOG("core", diag::LogWarning, "CSettings::LoadXml %s: name \"%.*s\" at line %u is longer than %u characters, cut",
-                   file->c_str(), static_cast<int>(std::min<size_t>(length, 200)), name, LineOf(name),
+                   file->c_str(), static_cast<int>(std::min<size_t>(length, 200)), name, LineOf(where),
                    static_cast<unsigned>(kMaxNameLength));
             length = kMaxNameLength;
         }
@@ -353,12 +356,12 @@ struct SettingsLoader {
         if (!target)
             return; // inside a dropped element: dropped too
 
-        auto node = boost::make_shared<CSettingsGroup>(StringA88(context.CheckedName(record.name, record.nameLength)));
+        auto node = boost::make_shared<CSettingsGroup>(StringA88(context.CheckedName(record.name, record.nameLength, record.name)));
         record.user = node.get();
         if (underName) {
             std::string_view named(*underName);
             if (named.size() > kMaxNameLength)
-                named = context.CheckedName(underName->data(), underName->size());
+                named = context.CheckedName(underName->data(), underName->size(), record.name);
             target->AddChild(std::move(node), StringA88(named));
         } else {
             target->AddChild(std::move(node));
@@ -371,7 +374,7 @@ struct SettingsLoader {
         auto& context = *static_cast<LoadContext*>(user);
         misc::XmlRecord& record = stack[depth];
         if (CSettingsGroup* node = NodeOf(record)) {
-            node->AddValue(InternId(context.CheckedName(name, nameLength)), std::string_view(value, valueLength));
+            node->AddValue(InternId(context.CheckedName(name, nameLength, name)), std::string_view(value, valueLength));
         } else if (std::string* pending = PendingNameOf(record)) {
             if (std::string_view(name, nameLength) == "name")
                 pending->assign(value, valueLength);

@@ -154,6 +154,12 @@ TEST(Settings, LoadingLogsAndAddsUp)
     const CSettingsGroup& cut = settings.GetChild(longName.substr(0, 87));
     EXPECT_EQ(cut.GetValue(longName.substr(0, 87)), "v");
     EXPECT_TRUE(log.Contains("longer than 87 characters, cut"));
+    EXPECT_TRUE(Load(settings, "<xml><s><named_object name=\"" + longName + "\">\n<o/></named_object></s></xml>", "named.xml"));
+    EXPECT_NE(settings.GetChild("s").GetNamedChildRef(longName.substr(0, 87)), nullptr);
+    EXPECT_TRUE(log.Contains("named.xml: name \"" + longName + "\" at line 2 is longer"));
+
+    EXPECT_FALSE(Load(settings, "", "empty.xml"));
+    EXPECT_TRUE(HasEntry(log, "core|3|CSettings::LoadXml failed on file empty.xml"));
 }
 
 TEST(Settings, LoadXmlDirectReadsFromTheWorkingFolder)
