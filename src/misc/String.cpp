@@ -84,7 +84,8 @@ void BasicString::Assign(const void* text, size_t len, size_t _char_size)
         OX_ASSERT(len + 1 <= max_size);
         len = max_size - 1; // cut to the capacity
     }
-    memmove(Data(), text, len * _char_size);
+    if (len)
+        memmove(Data(), text, len * _char_size);
     SetChar(Data(), len, 0, _char_size);
     size = static_cast<uint16_t>(len);
     hash = 0;
