@@ -276,6 +276,36 @@ TEST_F(Classes, IntrusivePointersCountEveryHolder)
     EXPECT_EQ(host.Run("local a, b = game.MakeNode(1), game.MakeNode(2) local get = a.GetValue a.swap(b) return get()"), "2");
 }
 
+TEST_F(Classes, BindingAgainReplacesAndValuesConvertForNativeCallers)
+{
+    // A second binding of the same vocabulary replaces classes and same-signature overloads.
+    host.Declare([] {
+        return Namespace("game")
+            .AddClass(Class<Widget>("Widget").Constructor<>().Method("Name", [](const Widget&) { return "again"; }))
+            .AddFunction(Function("AsWidget", [](Widget* w) { return w; }));
+    });
+    EXPECT_EQ(host.Run("return game.AsWidget(game.Widget()).Name()"), "again");
+    EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
+
+    lua_State* L = host.GetLuaState();
+    ASSERT_EQ(PushValue(host, L, Vec(1, 2)), 1);
+    Vec copy;
+    EXPECT_LT(MatchValue<Vec>(host, L, -1), i::NoMatch);
+    EXPECT_TRUE(ExtractValue(host, L, -1, copy));
+    EXPECT_EQ(copy.Y, 2);
+    EXPECT_EQ(host.Run("return 'x'"), "x"); // the stack is left to its owner
+    lua_pushboolean(L, 1);
+    int number = 0;
+    EXPECT_EQ(MatchValue<int>(host, L, -1), 2);
+    EXPECT_TRUE(ExtractValue(host, L, -1, number));
+    EXPECT_EQ(number, 1);
+    EXPECT_EQ(MatchValue<Vec>(host, L, -1), i::NoMatch);
+    lua_settop(L, 0);
+    EXPECT_EQ(PushValue(host, L, static_cast<Hidden*>(nullptr)), 1);
+    EXPECT_TRUE(lua_isnil(L, -1));
+    lua_settop(L, 0);
+}
+
 TEST(RefCounted, CountsAndDeletesAtZero)
 {
     Node* node = new Node;

@@ -292,4 +292,50 @@ private:
     std::vector<i::GenericConstant*> m_Constants;
 };
 
+// --- values for native code that calls into Lua ---
+
+namespace i {
+template <class T>
+using ValueParam = std::conditional_t<std::is_class_v<T>, const T&, T>;
+
+inline int AbsoluteIndex(lua_State* L, int index)
+{
+    return index < 0 && index > LUA_REGISTRYINDEX ? lua_gettop(L) + index + 1 : index;
+}
+} // namespace i
+
+// Pushes an argument the way a bound function pushes its result: an object of a bound
+// class as an owned copy, a pointer as a non-owning variable (nil for null). Gives the
+// number of values pushed (0 after a report).
+template <class T>
+int PushValue(CHost& host, lua_State* L, const T& value)
+{
+    if constexpr (std::is_class_v<T>)
+        return i::PushResult<T>(host, L, T(value));
+    else
+        return i::PushResult<const T&>(host, L, value);
+}
+
+// The score of the value at `index` as a T; i::NoMatch when it can't be converted.
+template <class T>
+int MatchValue(CHost& host, lua_State* L, int index)
+{
+    return i::Param<i::ValueParam<T>>::Match(host, L, i::AbsoluteIndex(L, index), true);
+}
+
+// Reads the value at `index` as a T (after MatchValue said it can). Text stays valid while
+// the Lua value is on the stack.
+template <class T>
+bool ExtractValue(CHost& host, lua_State* L, int index, T& out)
+{
+    using P = i::ValueParam<T>;
+    size_t depth = host.TemporariesDepth();
+    typename i::Param<P>::Storage storage;
+    bool extracted = i::Param<P>::Extract(host, L, i::AbsoluteIndex(L, index), storage);
+    if (extracted)
+        out = i::Param<P>::Get(storage);
+    host.ReleaseTemporaries(depth);
+    return extracted;
+}
+
 } // namespace mluabind

@@ -7,6 +7,7 @@
 #include "lua/mluabind/impl/Dispatch.h"
 #include "misc/Unicode.h"
 
+#include <algorithm>
 #include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
@@ -142,8 +143,6 @@ void CHost::Report(const char* format, ...)
     va_start(args, format);
     std::string text = ox::misc::VFormat(format, args);
     va_end(args);
-    if (m_Frame)
-        m_Frame->Failed = true;
     ReportError("%s", text.c_str());
 }
 
@@ -236,6 +235,7 @@ const std::vector<i::GenericFunction*>* CHost::FindFunctions(const std::string& 
 void CHost::Bind(const Namespace& ns)
 {
     int top = lua_gettop(L);
+    lua_checkstack(L, 64);
     for (i::GenericClass* cls : ns.Classes())
         ExportClass(cls, LUA_GLOBALSINDEX, cls->FullName.c_str());
     for (i::GenericFunction* function : ns.Functions())
@@ -253,6 +253,7 @@ void CHost::ExportDotted(Item* item, int table, const char* name, Fn&& leaf)
     if (table < 0 && table > LUA_REGISTRYINDEX)
         table = lua_gettop(L) + table + 1;
     const char* dot = std::strchr(name, '.');
+    lua_checkstack(L, 16);
     if (!dot) {
         leaf(item, table, name);
         return;
@@ -372,8 +373,18 @@ void CHost::ExportClass(i::GenericClass* cls, int table, const char* name)
 void CHost::ExportFunction(i::GenericFunction* function, int table, const char* name)
 {
     ExportDotted(function, table, name, [this](i::GenericFunction* f, int parent, const char* short_name) {
+        // An overload with the same parameter types replaces the earlier one, so that
+        // binding a vocabulary again doesn't make every call ambiguous.
         std::vector<i::GenericFunction*>& overloads = m_FunctionsByName[f->FullName];
-        overloads.push_back(f);
+        auto same = std::find_if(overloads.begin(), overloads.end(),
+                                 [this, f](i::GenericFunction* g) {
+                                     return g == f || (g->MatchFunction == f->MatchFunction &&
+                                                       g->SignatureFunction(*this) == f->SignatureFunction(*this));
+                                 });
+        if (same != overloads.end())
+            *same = f;
+        else
+            overloads.push_back(f);
         lua_pushstring(L, short_name);
         lua_pushlightuserdata(L, this);
         lua_pushstring(L, f->FullName.c_str());

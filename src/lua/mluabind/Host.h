@@ -81,7 +81,7 @@ public:
 
     // --- used by the binding layer itself ---
 
-    // Reports through ReportError and marks the running call as failed.
+    // Formats without a length limit and hands the text to ReportError.
     void Report(const char* format, ...) __attribute__((format(printf, 2, 3)));
     // Objects built implicitly for the call in progress.
     size_t TemporariesDepth() const { return m_Temporaries.size(); }

@@ -47,6 +47,28 @@ std::pair<const std::pair<int, GenericMethod*>*, const std::pair<int, GenericMet
     return {&*begin, &*begin + (end - begin)};
 }
 
+const MethodRun* GenericClass::FindRun(const char* name)
+{
+    if (m_RunsBuiltFor != m_Methods.size()) {
+        // Existing runs are updated in place: closures may hold them.
+        for (auto& [run_name, run] : m_Runs)
+            run.Count = 0;
+        for (size_t k = 0; k < m_Methods.size();) {
+            size_t end = k + 1;
+            while (end < m_Methods.size() && std::strcmp(m_Methods[end].first, m_Methods[k].first) == 0)
+                ++end;
+            MethodRun& run = m_Runs[m_Methods[k].first];
+            run.Owner = this;
+            run.Begin = &m_Methods[k];
+            run.Count = end - k;
+            k = end;
+        }
+        m_RunsBuiltFor = m_Methods.size();
+    }
+    auto it = m_Runs.find(name);
+    return it == m_Runs.end() || it->second.Count == 0 ? nullptr : &it->second;
+}
+
 GenericMember* GenericClass::FindOwnMember(const char* name) const
 {
     for (auto& [member_name, member] : m_Members)

@@ -23,7 +23,6 @@ using SignatureFn = std::string (*)(CHost& host);
 // One running call of an entry point from Lua (see the error model in Host.h).
 struct CallFrame {
     CallFrame* Previous = nullptr;
-    bool Failed = false; // something was reported during the call
     bool Raise = false;  // the default ReportError asks to raise Message
     std::string Message;
 };
@@ -167,6 +166,15 @@ struct NameLess {
     bool operator()(const char* a, const std::pair<const char*, GenericMethod*>& b) const { return std::strcmp(a, b.first) < 0; }
 };
 
+class GenericClass;
+
+// The overloads of one name in one class, at a stable address for method closures.
+struct MethodRun {
+    GenericClass* Owner = nullptr;
+    const std::pair<const char*, GenericMethod*>* Begin = nullptr;
+    size_t Count = 0;
+};
+
 class GenericClass : public DeclaratedClass {
 public:
     using MethodEntry = std::pair<const char*, GenericMethod*>;
@@ -188,11 +196,14 @@ public:
     // The instance metatable in the Lua registry, made when the class is published.
     int m_MetatableRef = LUA_NOREF;
 
+
     void AddMethod(GenericMethod* method);
     void AddOperator(int index, GenericMethod* method);
 
     // The run of overloads of a name, or an empty run.
     std::pair<const MethodEntry*, const MethodEntry*> FindMethodRun(const char* name) const;
+    // The same run as a stable object (refreshed in place when methods were added).
+    const MethodRun* FindRun(const char* name);
     std::pair<const std::pair<int, GenericMethod*>*, const std::pair<int, GenericMethod*>*> FindOperatorRun(int index) const;
     GenericMember* FindOwnMember(const char* name) const;
     GenericConstant* FindOwnConstant(const char* name) const;
@@ -208,6 +219,10 @@ public:
     // The first constructor that can build this class implicitly from the value at
     // `index`, or null.
     ConstructorDescription* FindImplicitConstructor(CHost& host, lua_State* L, int index) const;
+
+private:
+    std::map<std::string, MethodRun, std::less<>> m_Runs;
+    size_t m_RunsBuiltFor = 0;
 };
 
 } // namespace mluabind::i

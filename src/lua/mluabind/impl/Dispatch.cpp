@@ -15,7 +15,8 @@ using Body = int (*)(CHost& host, lua_State* L);
 
 // Runs a body inside a call frame. Gives -1 when the frame's message was pushed and must
 // be raised; every C++ object of the call is gone by then.
-__attribute__((noinline)) int Guarded(lua_State* L, Body body) noexcept
+template <Body body>
+__attribute__((noinline)) int Guarded(lua_State* L) noexcept
 {
     CHost* host = static_cast<CHost*>(lua_touserdata(L, lua_upvalueindex(1)));
     CallFrame frame;
@@ -48,7 +49,7 @@ __attribute__((noinline)) int Guarded(lua_State* L, Body body) noexcept
 template <Body body>
 int Entry(lua_State* L)
 {
-    int results = Guarded(L, body);
+    int results = Guarded<body>(L);
     if (results < 0)
         return lua_error(L);
     return results;
@@ -56,7 +57,11 @@ int Entry(lua_State* L)
 
 struct TemporariesScope {
     explicit TemporariesScope(CHost& host) : Host(host), Depth(host.TemporariesDepth()) {}
-    ~TemporariesScope() { Host.ReleaseTemporaries(Depth); }
+    ~TemporariesScope()
+    {
+        if (Host.TemporariesDepth() > Depth)
+            Host.ReleaseTemporaries(Depth);
+    }
     TemporariesScope(const TemporariesScope&) = delete;
     TemporariesScope& operator=(const TemporariesScope&) = delete;
     CHost& Host;
@@ -154,26 +159,22 @@ int MethodCallDispatcher(CHost& host, lua_State* L, LuaCustomVariable& view, Lua
     return 0;
 }
 
-// The class that holds the overloads of `name`: the class itself, else the first found
-// through its adapters in map order.
-bool FindMethod(CHost& host, GenericClass* cls, const char* name, GenericClass*& owner,
-                const GenericClass::MethodEntry*& run, size_t& count, int depth)
+// The overloads of `name` in the class itself, else the first found through its adapters
+// in map order.
+const MethodRun* FindMethod(CHost& host, GenericClass* cls, const char* name, int depth)
 {
-    auto [begin, end] = cls->FindMethodRun(name);
-    if (begin != end) {
-        owner = cls;
-        run = begin;
-        count = static_cast<size_t>(end - begin);
-        return true;
-    }
+    if (const MethodRun* run = cls->FindRun(name))
+        return run;
     if (depth >= MaxSearchDepth)
-        return false;
+        return nullptr;
     for (auto& [type, adapter] : cls->m_Adapters) {
         GenericClass* target = adapter->GetTargetGenericClass(host);
-        if (target && FindMethod(host, target, name, owner, run, count, depth + 1))
-            return true;
+        if (!target)
+            continue;
+        if (const MethodRun* run = FindMethod(host, target, name, depth + 1))
+            return run;
     }
-    return false;
+    return nullptr;
 }
 
 // Converts an object pointer of `from` to the class `to` that was found through adapters.
@@ -261,37 +262,27 @@ int IndexBody(CHost& host, lua_State* L)
         return 0;
     }
     lua_settop(L, 2);
-    // Method closures made before for this object wait in its environment table.
-    lua_getfenv(L, 1);
-    lua_pushvalue(L, 2);
-    lua_rawget(L, 3);
-    if (!lua_isnil(L, 4))
-        return 1;
-    lua_settop(L, 3);
-
     const char* name = lua_tostring(L, 2);
-    GenericClass* owner = nullptr;
-    const GenericClass::MethodEntry* run = nullptr;
-    size_t count = 0;
-    if (FindMethod(host, self->Class, name, owner, run, count, 0)) {
-        // The closure holds the object itself, so it can outlive every other reference.
+    if (const MethodRun* run = FindMethod(host, self->Class, name, 0)) {
+        // The closure holds the object itself, so it can outlive every other reference;
+        // it waits in the object's own environment table for the next lookup.
         lua_pushlightuserdata(L, &host);
         lua_pushvalue(L, 1);
-        lua_pushlightuserdata(L, owner);
-        lua_pushlightuserdata(L, const_cast<GenericClass::MethodEntry*>(run));
-        lua_pushnumber(L, static_cast<lua_Number>(count));
-        lua_pushcclosure(L, &LuaMethodCallProxieFunction, 5);
+        lua_pushlightuserdata(L, const_cast<MethodRun*>(run));
+        lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3); // 3
+        lua_getfenv(L, 1);                                     // 4
         lua_rawgeti(L, LUA_REGISTRYINDEX, host.GetFreshEnvironmentRef());
-        if (lua_rawequal(L, 3, 5)) {
+        if (lua_rawequal(L, 4, 5)) {
             lua_newtable(L);
-            lua_replace(L, 3);
-            lua_pushvalue(L, 3);
+            lua_replace(L, 4);
+            lua_pushvalue(L, 4);
             lua_setfenv(L, 1);
         }
         lua_settop(L, 4);
         lua_pushvalue(L, 2);
-        lua_pushvalue(L, 4);
-        lua_rawset(L, 3);
+        lua_pushvalue(L, 3);
+        lua_rawset(L, 4);
+        lua_settop(L, 3);
         return 1;
     }
     int results = 0;
@@ -325,20 +316,19 @@ int NewIndexBody(CHost& host, lua_State* L)
 int MethodCallBody(CHost& host, lua_State* L)
 {
     auto* self = static_cast<LuaCustomVariable*>(lua_touserdata(L, lua_upvalueindex(2)));
-    auto* owner = static_cast<GenericClass*>(lua_touserdata(L, lua_upvalueindex(3)));
-    auto* run = static_cast<const GenericClass::MethodEntry*>(lua_touserdata(L, lua_upvalueindex(4)));
-    auto count = static_cast<size_t>(lua_tonumber(L, lua_upvalueindex(5)));
-    if (!run || count == 0) {
+    auto* run = static_cast<const MethodRun*>(lua_touserdata(L, lua_upvalueindex(3)));
+    if (!run || run->Count == 0) {
         host.Report("GenericClass::LuaMethodCallProxieFunction: panic - can't find GenericMethod %s!\n", "?");
         return 0;
     }
+    GenericClass* owner = run->Owner;
     void* object = self->Class == owner ? self->Object : UpcastTo(host, self->Class, owner, self->Object, 0);
     if (!object) {
         ReportNull(host, "GenericClass::LuaMethodCallProxieFunction", owner);
         return 0;
     }
     LuaCustomVariable view{object, owner, 0, self->IsConst, kVariableTag};
-    return MethodCallDispatcher(host, L, view, self, run, count, run->first);
+    return MethodCallDispatcher(host, L, view, self, run->Begin, run->Count, run->Begin->first);
 }
 
 bool HasOperator(const LuaCustomVariable* variable, int index)
@@ -565,7 +555,19 @@ int GetRttiTypeBody(CHost&, lua_State* L) { return TypeBody(L, false, true); }
 
 } // namespace
 
-int MetaOperatorIndex(lua_State* L) { return Entry<&IndexBody>(L); }
+int MetaOperatorIndex(lua_State* L)
+{
+    // Fast path without a call frame: a method closure made before for this object.
+    if (lua_type(L, 1) == LUA_TUSERDATA && lua_type(L, 2) == LUA_TSTRING) {
+        lua_getfenv(L, 1);
+        lua_pushvalue(L, 2);
+        lua_rawget(L, -2);
+        if (!lua_isnil(L, -1))
+            return 1;
+        lua_settop(L, 2);
+    }
+    return Entry<&IndexBody>(L);
+}
 int MetaOperatorNewIndex(lua_State* L) { return Entry<&NewIndexBody>(L); }
 int LuaMethodCallProxieFunction(lua_State* L) { return Entry<&MethodCallBody>(L); }
 int LuaOperatorCallProxieFunction(lua_State* L) { return Entry<&OperatorBody>(L); }
