@@ -2,6 +2,11 @@
 // calls from coroutines and on objects that are gone or foreign.
 #include "lua/LuaTestHost.h"
 
+#include "support/TestSupport.h"
+
+#include <memory>
+#include <vector>
+
 #include <string>
 
 using namespace mluabind;
@@ -246,6 +251,65 @@ TEST(DispatchRaising, NativeExceptionsBecomeReports)
     EXPECT_EQ(host.Run("return select(2, pcall(throws, 1))"),
               "mluabind: error - native exception in a bound call: too big\n");
     EXPECT_EQ(host.Run("return throws(0)"), "0");
+}
+
+// Ownership moves with the adopt policies.
+struct Pool {
+    std::vector<std::unique_ptr<Base>> Items;
+    void Take(Base* base) { Items.emplace_back(base); }
+};
+
+// Built implicitly from a Text only: conversions must not chain through Text.
+struct Label {
+    std::string Value;
+    Label(const Text& text) : Value(text.Value) {}
+};
+
+TEST(DispatchPolicies, AdoptMovesOwnershipAndConversionsDontChain)
+{
+    LuaTestHost host;
+    static Pool pool;
+    host.Declare([] {
+        return Namespace()
+            .AddClass(Class<Base>("Base").Constructor<>().Method("Name", &Base::Name).Method(
+                "Forget", [](Base&) {}, Adopt(0)))
+            .AddClass(Class<Derived>("Derived").BaseClass<Base>().Constructor<>())
+            .AddClass(Class<Pool>("Pool").Method("Take", &Pool::Take, Adopt(1)))
+            .AddClass(Class<Text>("Text").Constructor<const char*>())
+            .AddClass(Class<Label>("Label").Constructor<const Text&>())
+            .AddFunction(Function("pool", [] { return &pool; }))
+            .AddFunction(Function("make", [] { return static_cast<Base*>(new Derived); }, Adopt(-1)))
+            .AddFunction(Function("label", [](const Label& label) { return label.Value.c_str(); }));
+    });
+    EXPECT_EQ(host.Run("b = Derived() pool().Take(b) return __get_typeex(b)"), "Derived");
+    EXPECT_EQ(host.Run("local m = make() return __get_typeex(m) .. ' ' .. m.Name()"), "Base owned derived");
+    EXPECT_EQ(host.Run("local f = Base() f.Forget() return __get_typeex(f)"), "Base");
+    host.Run("b = nil collectgarbage()");
+    ASSERT_EQ(pool.Items.size(), 1u);
+    EXPECT_STREQ(pool.Items[0]->Name(), "derived"); // not deleted by Lua
+    pool.Items.clear();
+
+    EXPECT_EQ(host.Run("return label(Text('t'))"), "t");
+    EXPECT_EQ(host.Run("return label('t')"), "nil");
+    EXPECT_NE(host.LastReport().find("label(const Label&)\nParameters are:\n* string\nCaused by: no one can be used.\n"),
+              std::string::npos);
+}
+
+TEST(DispatchPolicies, DeclarationModeAndHostStackContracts)
+{
+    LuaTestHost host;
+    host.BeginBinding();
+    EXPECT_EQ(CHost::GetCurrentHost(), &host);
+    EXPECT_CONTRACT_FAILURE(host.BeginBinding(), "m_CurrentBindingHost == 0");
+    host.EndBinding();
+    EXPECT_CONTRACT_FAILURE(host.EndBinding(), "m_CurrentBindingHost == this");
+    EXPECT_CONTRACT_FAILURE(CHost::PopCurrentHost(), "Top>-1");
+    EXPECT_CONTRACT_FAILURE(CHost::GetCurrentHost(), "!Empty()");
+    for (int k = 0; k < 32; ++k)
+        CHost::PushCurrentHost(&host);
+    EXPECT_CONTRACT_FAILURE(CHost::PushCurrentHost(&host), "Top>=-1 && Top<MaxSize-1");
+    for (int k = 0; k < 32; ++k)
+        CHost::PopCurrentHost();
 }
 
 } // namespace

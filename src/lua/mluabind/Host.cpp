@@ -31,7 +31,25 @@ struct CurrentHostStack {
     static constexpr int MaxSize = 32;
     CHost* Items[MaxSize] = {};
     int Top = -1;
+
     bool Empty() const { return Top < 0; }
+    void Push(CHost* host)
+    {
+        OX_ASSERT(Top>=-1 && Top<MaxSize-1);
+        if (Top < MaxSize - 1)
+            Items[++Top] = host;
+    }
+    void Pop()
+    {
+        OX_ASSERT(Top>-1);
+        if (Top > -1)
+            --Top;
+    }
+    CHost* Last() const
+    {
+        OX_ASSERT(!Empty());
+        return Empty() ? nullptr : Items[Top];
+    }
 };
 CurrentHostStack g_CurrentHosts;
 
@@ -187,30 +205,11 @@ void* i::AllocateForDeclaration(size_t size, void (*destroy)(void*))
     return orphans->Allocate(size, nullptr);
 }
 
-void CHost::PushCurrentHost(CHost* host)
-{
-    int& Top = g_CurrentHosts.Top;
-    constexpr int MaxSize = CurrentHostStack::MaxSize;
-    OX_ASSERT(Top>=-1 && Top<MaxSize-1);
-    if (Top >= MaxSize - 1)
-        return;
-    g_CurrentHosts.Items[++Top] = host;
-}
+void CHost::PushCurrentHost(CHost* host) { g_CurrentHosts.Push(host); }
 
-void CHost::PopCurrentHost()
-{
-    int& Top = g_CurrentHosts.Top;
-    OX_ASSERT(Top>-1);
-    if (Top > -1)
-        --Top;
-}
+void CHost::PopCurrentHost() { g_CurrentHosts.Pop(); }
 
-CHost* CHost::GetCurrentHost()
-{
-    const CurrentHostStack& stack = g_CurrentHosts;
-    OX_ASSERT(!stack.Empty());
-    return stack.Empty() ? nullptr : stack.Items[stack.Top];
-}
+CHost* CHost::GetCurrentHost() { return g_CurrentHosts.Last(); }
 
 i::GenericClass* CHost::FindClass(const std::type_info& type) const
 {
