@@ -272,7 +272,7 @@ TEST(DispatchPolicies, AdoptMovesOwnershipAndConversionsDontChain)
     host.Declare([] {
         return Namespace()
             .AddClass(Class<Base>("Base").Constructor<>().Method("Name", &Base::Name).Method(
-                "Forget", [](Base&) {}, Adopt(0)))
+                "GiveToPool", [](Base& base) { pool.Take(&base); }, Adopt(0)))
             .AddClass(Class<Derived>("Derived").BaseClass<Base>().Constructor<>())
             .AddClass(Class<Pool>("Pool").Method("Take", &Pool::Take, Adopt(1)))
             .AddClass(Class<Text>("Text").Constructor<const char*>())
@@ -283,9 +283,9 @@ TEST(DispatchPolicies, AdoptMovesOwnershipAndConversionsDontChain)
     });
     EXPECT_EQ(host.Run("b = Derived() pool().Take(b) return __get_typeex(b)"), "Derived");
     EXPECT_EQ(host.Run("local m = make() return __get_typeex(m) .. ' ' .. m.Name()"), "Base owned derived");
-    EXPECT_EQ(host.Run("local f = Base() f.Forget() return __get_typeex(f)"), "Base");
+    EXPECT_EQ(host.Run("local f = Base() f.GiveToPool() return __get_typeex(f)"), "Base");
     host.Run("b = nil collectgarbage()");
-    ASSERT_EQ(pool.Items.size(), 1u);
+    ASSERT_EQ(pool.Items.size(), 2u);
     EXPECT_STREQ(pool.Items[0]->Name(), "derived"); // not deleted by Lua
     pool.Items.clear();
 
