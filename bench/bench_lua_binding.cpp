@@ -1,0 +1,138 @@
+// Cost of a call through the binding layer against a hand-written Lua C function. Each
+// benchmark iteration runs a Lua loop of kCalls calls.
+#include "lua/mluabind/mluabind.h"
+
+#include <benchmark/benchmark.h>
+
+#include <cstdio>
+#include <cstdlib>
+
+namespace {
+
+constexpr int kCalls = 1000;
+
+struct Counter {
+    double Total = 0;
+    double Add(double value) { return Total += value; }
+    double Add(bool value) { return Total += value ? 1 : 0; }
+    double Add(const char* text) { return Total += text ? 1 : 0; }
+};
+
+// --- hand-written binding ---
+
+int RawAdd(lua_State* L)
+{
+    auto* counter = *static_cast<Counter**>(luaL_checkudata(L, 1, "RawCounter"));
+    lua_pushnumber(L, counter->Add(static_cast<double>(luaL_checknumber(L, 2))));
+    return 1;
+}
+
+int RawCollect(lua_State* L)
+{
+    delete *static_cast<Counter**>(luaL_checkudata(L, 1, "RawCounter"));
+    return 0;
+}
+
+void RegisterRaw(lua_State* L)
+{
+    luaL_newmetatable(L, "RawCounter");
+    lua_newtable(L);
+    lua_pushcfunction(L, &RawAdd);
+    lua_setfield(L, -2, "Add");
+    lua_setfield(L, -2, "__index");
+    lua_pushcfunction(L, &RawCollect);
+    lua_setfield(L, -2, "__gc");
+    lua_pop(L, 1);
+    auto** slot = static_cast<Counter**>(lua_newuserdata(L, sizeof(Counter*)));
+    *slot = new Counter;
+    luaL_getmetatable(L, "RawCounter");
+    lua_setmetatable(L, -2);
+    lua_setglobal(L, "raw");
+}
+
+// --- bound through mluabind ---
+
+class BenchHost : public mluabind::CHost {
+public:
+    BenchHost() : CHost(NewState(), true)
+    {
+        using namespace mluabind;
+        BeginBinding();
+        Bind(Namespace("bench")
+                 .AddClass(Class<Counter>("Counter")
+                               .Constructor<>()
+                               .Method("Add", static_cast<double (Counter::*)(double)>(&Counter::Add))
+                               .Method("AddAny", static_cast<double (Counter::*)(const char*)>(&Counter::Add))
+                               .Method("AddAny", static_cast<double (Counter::*)(bool)>(&Counter::Add))
+                               .Method("AddAny", static_cast<double (Counter::*)(double)>(&Counter::Add))));
+        EndBinding();
+        RegisterRaw(L);
+        Run("bound = bench.Counter()");
+    }
+
+    void ReportError(const char* format, ...) override __attribute__((format(printf, 2, 3)))
+    {
+        va_list args;
+        va_start(args, format);
+        vfprintf(stderr, format, args);
+        va_end(args);
+        std::abort();
+    }
+
+    // Compiles `function(n) <body> end` into a global named `name`.
+    void Define(const char* name, const char* body)
+    {
+        char code[512];
+        snprintf(code, sizeof(code), "function %s(n) for i = 1, n do %s end end", name, body);
+        Run(code);
+    }
+
+    void Call(const char* name)
+    {
+        lua_getglobal(L, name);
+        lua_pushnumber(L, kCalls);
+        if (lua_pcall(L, 1, 0, 0) != 0) {
+            fprintf(stderr, "%s\n", lua_tostring(L, -1));
+            std::abort();
+        }
+    }
+
+private:
+    void Run(const char* code)
+    {
+        if (luaL_dostring(L, code) != 0) {
+            fprintf(stderr, "%s\n", lua_tostring(L, -1));
+            std::abort();
+        }
+    }
+
+    static lua_State* NewState()
+    {
+        lua_State* state = luaL_newstate();
+        luaL_openlibs(state);
+        return state;
+    }
+};
+
+void RunLoop(benchmark::State& state, const char* body)
+{
+    BenchHost host;
+    host.Define("loop", body);
+    for (auto _ : state)
+        host.Call("loop");
+    state.SetItemsProcessed(state.iterations() * kCalls);
+}
+
+void BM_RawCApiMemberCall(benchmark::State& state) { RunLoop(state, "raw:Add(1)"); }
+void BM_BoundMemberCall(benchmark::State& state) { RunLoop(state, "bound.Add(1)"); }
+void BM_BoundOverloadedCall(benchmark::State& state) { RunLoop(state, "bound.AddAny(1)"); }
+void BM_BoundConstructor(benchmark::State& state) { RunLoop(state, "local c = bench.Counter()"); }
+
+BENCHMARK(BM_RawCApiMemberCall);
+BENCHMARK(BM_BoundMemberCall);
+BENCHMARK(BM_BoundOverloadedCall);
+BENCHMARK(BM_BoundConstructor);
+
+} // namespace
+
+BENCHMARK_MAIN();

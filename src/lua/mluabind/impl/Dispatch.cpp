@@ -1,0 +1,645 @@
+// Call dispatch: the metamethods of bound objects, the dispatchers of methods, operators,
+// constructors and free functions, and the host-wide script functions.
+#include "lua/mluabind/impl/Dispatch.h"
+
+#include "lua/mluabind/Binding.h"
+
+#include <exception>
+#include <string>
+
+namespace mluabind::i {
+
+namespace {
+
+using Body = int (*)(CHost& host, lua_State* L);
+
+// Runs a body inside a call frame. Gives -1 when the frame's message was pushed and must
+// be raised; every C++ object of the call is gone by then.
+template <Body body>
+__attribute__((noinline)) int Guarded(lua_State* L) noexcept
+{
+    CHost* host = static_cast<CHost*>(lua_touserdata(L, lua_upvalueindex(1)));
+    CallFrame frame;
+    frame.Previous = host->GetFrame();
+    host->SetFrame(&frame);
+    int results;
+    try {
+        try {
+            results = body(*host, L);
+        } catch (const std::exception& e) {
+            results = 0;
+            host->Report("mluabind: error - native exception in a bound call: %s\n", e.what());
+        } catch (...) {
+            results = 0;
+            host->Report("mluabind: error - native exception in a bound call: %s\n", "unknown");
+        }
+    } catch (...) {
+        // The report itself failed; nothing may escape into Lua.
+        results = 0;
+    }
+    host->SetFrame(frame.Previous);
+    if (frame.Raise) {
+        lua_pushlstring(L, frame.Message.data(), frame.Message.size());
+        return -1;
+    }
+    return results;
+}
+
+// The C function Lua sees: raising is its last statement, in a frame without objects.
+template <Body body>
+int Entry(lua_State* L)
+{
+    int results = Guarded<body>(L);
+    if (results < 0)
+        return lua_error(L);
+    return results;
+}
+
+struct TemporariesScope {
+    explicit TemporariesScope(CHost& host) : Host(host), Depth(host.TemporariesDepth()) {}
+    ~TemporariesScope()
+    {
+        if (Host.TemporariesDepth() > Depth)
+            Host.ReleaseTemporaries(Depth);
+    }
+    TemporariesScope(const TemporariesScope&) = delete;
+    TemporariesScope& operator=(const TemporariesScope&) = delete;
+    CHost& Host;
+    size_t Depth;
+};
+
+constexpr int MaxMethodCandidates = 50;
+constexpr int MaxFunctionCandidates = 20;
+constexpr int MaxSearchDepth = 32;
+
+const char* Cause(int best) { return best == NoMatch ? "no one can be used" : "ambiguity"; }
+
+void ReportForeign(CHost& host, const char* where)
+{
+    host.Report("%s: error - the value is not an object of a bound class.\n", where);
+}
+
+void ReportNull(CHost& host, const char* where, const GenericClass* cls)
+{
+    host.Report("%s: error - the object of %s is null or was collected.\n", where, cls->FullName.c_str());
+}
+
+int MatchMethod(CHost& host, lua_State* L, GenericMethod* method, const LuaCustomVariable& view,
+                const LuaCustomVariable* self)
+{
+    if (view.IsConst && !method->IsConst)
+        return NoMatch;
+    int factor = !view.IsConst && method->IsConst ? 2 : 1;
+    if (method->SelfFirst && ToVariable(L, 1) != self)
+        return NoMatch;
+    int score = method->MatchFunction(host, L, method->SelfFirst ? 2 : 1, 0, true);
+    return score >= NoMatch ? NoMatch : score * factor;
+}
+
+int InvokeMethod(CHost& host, lua_State* L, GenericMethod* method, LuaCustomVariable& view, LuaCustomVariable* self)
+{
+    if (host.GetFrame()->Raise)
+        return 0; // matching reported: the call unwinds without running
+    if (method->SelfFirst)
+        lua_remove(L, 1);
+    TemporariesScope scope(host);
+    if (method->Policy)
+        method->Policy->RunBefore(host, L, self);
+    int results = method->Call(host, L, view);
+    if (method->Policy)
+        results = method->Policy->RunAfter(host, L, self, results);
+    return results;
+}
+
+// Picks the overload with the lowest score among a run of methods or operators; runs it
+// when it is the only one, else reports the candidates and the arguments.
+template <class Entry>
+int MethodCallDispatcher(CHost& host, lua_State* L, LuaCustomVariable& view, LuaCustomVariable* self,
+                         const Entry* run, size_t count, const char* name)
+{
+    GenericMethod* candidates[MaxMethodCandidates];
+    int found = 0;
+    int best = NoMatch;
+    if (count == 1) {
+        // The common case needs no candidate list.
+        GenericMethod* method = run[0].second;
+        best = MatchMethod(host, L, method, view, self);
+        if (best < NoMatch)
+            return InvokeMethod(host, L, method, view, self);
+        candidates[found++] = method;
+        count = 0;
+    }
+    for (size_t k = 0; k < count; ++k) {
+        GenericMethod* method = run[k].second;
+        int score = MatchMethod(host, L, method, view, self);
+        if (score < best) {
+            best = score;
+            found = 0;
+            candidates[found++] = method;
+        } else if (score == best && found < MaxMethodCandidates - 1) {
+            candidates[found++] = method;
+        }
+    }
+    if (best != NoMatch && found == 1)
+        return InvokeMethod(host, L, candidates[0], view, self);
+
+    std::string lines;
+    for (int k = 0; k < found; ++k) {
+        lines += candidates[k]->Name;
+        lines += "(";
+        lines += candidates[k]->SignatureFunction(host);
+        lines += ")";
+        if (candidates[k]->IsConst)
+            lines += " const";
+        lines += "\n";
+    }
+    host.Report("Can't match method to call '%s.%s%s', candidates are:\n%sParameters are:\n%sCaused by: %s.\n",
+                view.Class->FullName.c_str(), name, view.IsConst ? " const" : "", lines.c_str(),
+                DescribeParameters(L, 1).c_str(), Cause(best));
+    return 0;
+}
+
+// The overloads of `name` in the class itself, else the first found through its adapters
+// in map order.
+const MethodRun* FindMethod(CHost& host, GenericClass* cls, const char* name, int depth)
+{
+    if (const MethodRun* run = cls->FindRun(name))
+        return run;
+    if (depth >= MaxSearchDepth)
+        return nullptr;
+    for (auto& [type, adapter] : cls->m_Adapters) {
+        GenericClass* target = adapter->GetTargetGenericClass(host);
+        if (!target)
+            continue;
+        if (const MethodRun* run = FindMethod(host, target, name, depth + 1))
+            return run;
+    }
+    return nullptr;
+}
+
+// Converts an object pointer of `from` to the class `to` that was found through adapters.
+void* UpcastTo(CHost& host, GenericClass* from, GenericClass* to, void* object, int depth)
+{
+    if (from == to || !object)
+        return object;
+    if (from->CanUpcast(*to->m_Type))
+        return from->Upcast(host, *to->m_Type, object);
+    if (depth >= MaxSearchDepth)
+        return nullptr;
+    // No stored path (a base published after its derived class): walk the adapters.
+    for (auto& [type, adapter] : from->m_Adapters) {
+        GenericClass* target = adapter->GetTargetGenericClass(host);
+        if (!target)
+            continue;
+        if (void* result = UpcastTo(host, target, to, adapter->Upcast(object), depth + 1))
+            return result;
+    }
+    return nullptr;
+}
+
+// Members and constants of the class, then of the classes behind its adapters.
+bool FindMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& view, const char* name, int& results,
+                int depth)
+{
+    if (GenericMember* member = cls->FindOwnMember(name)) {
+        if (!view.Object) {
+            ReportNull(host, "MetaOperatorIndex", cls);
+            results = 0;
+        } else {
+            results = member->Get(host, L, view);
+        }
+        return true;
+    }
+    if (GenericConstant* constant = cls->FindOwnConstant(name)) {
+        constant->Push(host, L);
+        results = 1;
+        return true;
+    }
+    if (depth >= MaxSearchDepth)
+        return false;
+    for (auto& [type, adapter] : cls->m_Adapters) {
+        GenericClass* target = adapter->GetTargetGenericClass(host);
+        if (!target)
+            continue;
+        LuaCustomVariable base{view.Object ? adapter->Upcast(view.Object) : nullptr, target, 0, view.IsConst, kVariableTag};
+        if (FindMember(host, L, target, base, name, results, depth + 1))
+            return true;
+    }
+    return false;
+}
+
+bool SetMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& view, const char* name, int depth)
+{
+    if (GenericMember* member = cls->FindOwnMember(name)) {
+        if (!view.Object)
+            ReportNull(host, "MetaOperatorNewIndex", cls);
+        else
+            member->Set(host, L, view, lua_gettop(L));
+        return true;
+    }
+    if (depth >= MaxSearchDepth)
+        return false;
+    for (auto& [type, adapter] : cls->m_Adapters) {
+        GenericClass* target = adapter->GetTargetGenericClass(host);
+        if (!target)
+            continue;
+        LuaCustomVariable base{view.Object ? adapter->Upcast(view.Object) : nullptr, target, 0, view.IsConst, kVariableTag};
+        if (SetMember(host, L, target, base, name, depth + 1))
+            return true;
+    }
+    return false;
+}
+
+int IndexBody(CHost& host, lua_State* L)
+{
+    if (lua_type(L, 2) != LUA_TSTRING) {
+        host.Report("MetaOperatorIndex: panic - currently supports only string indexes.\n");
+        return 0;
+    }
+    LuaCustomVariable* self = ToVariable(L, 1);
+    if (!self) {
+        ReportForeign(host, "MetaOperatorIndex");
+        return 0;
+    }
+    lua_settop(L, 2);
+    const char* name = lua_tostring(L, 2);
+    if (const MethodRun* run = FindMethod(host, self->Class, name, 0)) {
+        // The closure holds the object itself, so it can outlive every other reference;
+        // it waits in the object's own environment table for the next lookup.
+        lua_pushlightuserdata(L, &host);
+        lua_pushvalue(L, 1);
+        lua_pushlightuserdata(L, const_cast<MethodRun*>(run));
+        lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3); // 3
+        lua_getfenv(L, 1);                                     // 4
+        lua_rawgeti(L, LUA_REGISTRYINDEX, host.GetFreshEnvironmentRef());
+        if (lua_rawequal(L, 4, 5)) {
+            lua_newtable(L);
+            lua_replace(L, 4);
+            lua_pushvalue(L, 4);
+            lua_setfenv(L, 1);
+        }
+        lua_settop(L, 4);
+        lua_pushvalue(L, 2);
+        lua_pushvalue(L, 3);
+        lua_rawset(L, 4);
+        lua_settop(L, 3);
+        return 1;
+    }
+    int results = 0;
+    if (FindMember(host, L, self->Class, *self, name, results, 0))
+        return results;
+    host.Report("MetaOperatorIndex: error - unknown symbol %s.\n", name);
+    return 0;
+}
+
+int NewIndexBody(CHost& host, lua_State* L)
+{
+    if (lua_type(L, 2) != LUA_TSTRING) {
+        host.Report("MetaOperatorNewIndex: panic - currently supports only string indexes.\n");
+        return 0;
+    }
+    LuaCustomVariable* self = ToVariable(L, 1);
+    if (!self) {
+        ReportForeign(host, "MetaOperatorNewIndex");
+        return 0;
+    }
+    const char* name = lua_tostring(L, 2);
+    if (self->IsConst) {
+        host.Report("MetaOperatorNewIndex: can't assign a value to a member '%s' of a const object.\n", name);
+        return 0;
+    }
+    if (!SetMember(host, L, self->Class, *self, name, 0))
+        host.Report("MetaOperatorIndex: error - unknown symbol %s.\n", name);
+    return 0;
+}
+
+int MethodCallBody(CHost& host, lua_State* L)
+{
+    auto* self = static_cast<LuaCustomVariable*>(lua_touserdata(L, lua_upvalueindex(2)));
+    auto* run = static_cast<const MethodRun*>(lua_touserdata(L, lua_upvalueindex(3)));
+    if (!run || run->Count == 0) {
+        host.Report("GenericClass::LuaMethodCallProxieFunction: panic - can't find GenericMethod %s!\n", "?");
+        return 0;
+    }
+    GenericClass* owner = run->Owner;
+    void* object = self->Class == owner ? self->Object : UpcastTo(host, self->Class, owner, self->Object, 0);
+    if (!object) {
+        ReportNull(host, "GenericClass::LuaMethodCallProxieFunction", owner);
+        return 0;
+    }
+    LuaCustomVariable view{object, owner, 0, self->IsConst, kVariableTag};
+    return MethodCallDispatcher(host, L, view, self, run->Begin, run->Count, run->Begin->first);
+}
+
+bool HasOperator(const LuaCustomVariable* variable, int index)
+{
+    if (!variable)
+        return false;
+    auto [begin, end] = variable->Class->FindOperatorRun(index);
+    return begin != end;
+}
+
+int OperatorBody(CHost& host, lua_State* L)
+{
+    int index = static_cast<int>(lua_tonumber(L, lua_upvalueindex(2)));
+    LuaCustomVariable* self = ToVariable(L, 1);
+    if (!HasOperator(self, index)) {
+        self = ToVariable(L, 2);
+        if (!HasOperator(self, index)) {
+            host.Report("GenericClass::LuaOperatorCallProxieFunction: panic - can't find a variable to call operator handler for '%s'",
+                        OperatorEventName(index));
+            return 0;
+        }
+    }
+    if (index == OpUnm)
+        lua_pop(L, 1); // Lua passes the operand twice
+    if (!self->Object) {
+        ReportNull(host, "GenericClass::LuaOperatorCallProxieFunction", self->Class);
+        return 0;
+    }
+    auto [begin, end] = self->Class->FindOperatorRun(index);
+    LuaCustomVariable view = *self;
+    return MethodCallDispatcher(host, L, view, self, begin, static_cast<size_t>(end - begin), OperatorEventName(index));
+}
+
+int ConstructorBody(CHost& host, lua_State* L)
+{
+    auto* cls = static_cast<GenericClass*>(lua_touserdata(L, lua_upvalueindex(2)));
+    if (!cls) {
+        host.Report("CustomClass::Constructor panic - can't find GenericClass!\n");
+        return 0;
+    }
+    lua_remove(L, 1); // the class table
+    ConstructorDescription* candidates[MaxMethodCandidates];
+    int found = 0;
+    int best = NoMatch;
+    for (ConstructorDescription* constructor : cls->m_Constructors) {
+        int score = constructor->MatchFunction(host, L, 1, 0, true);
+        if (score < best) {
+            best = score;
+            found = 0;
+            candidates[found++] = constructor;
+        } else if (score == best && found < MaxMethodCandidates - 1) {
+            candidates[found++] = constructor;
+        }
+    }
+    if (best != NoMatch && found == 1) {
+        if (host.GetFrame()->Raise)
+            return 0;
+        ConstructorDescription* constructor = candidates[0];
+        TemporariesScope scope(host);
+        if (constructor->Policy)
+            constructor->Policy->RunBefore(host, L, nullptr);
+        void* object = constructor->CreateFunction(host, L, 1);
+        if (!object)
+            return 0;
+        LuaCustomVariable* variable = CreateVariable(host, L, cls, object, true, false);
+        int results = 1;
+        if (constructor->Policy)
+            results = constructor->Policy->RunAfter(host, L, variable, results);
+        return results;
+    }
+    std::string lines;
+    for (int k = 0; k < found; ++k)
+        lines += cls->FullName + "(" + candidates[k]->SignatureFunction(host) + ")\n";
+    host.Report("Can't match constructor to create %s, candidates are:\n%sParameters are:\n%sCaused by: %s.",
+                cls->FullName.c_str(), lines.c_str(), DescribeParameters(L, 1).c_str(), Cause(best));
+    return 0;
+}
+
+int FunctionBody(CHost& host, lua_State* L)
+{
+    const char* name = lua_tostring(L, lua_upvalueindex(2));
+    auto* overloads = static_cast<std::vector<GenericFunction*>*>(lua_touserdata(L, lua_upvalueindex(3)));
+    if (!overloads || overloads->empty()) {
+        host.Report("LuaGlobalFunctionDispatcher: panic - can't find GenericFunction %s!\n", name ? name : "");
+        return 0;
+    }
+    GenericFunction* candidates[MaxFunctionCandidates];
+    int found = 0;
+    int best = NoMatch;
+    for (GenericFunction* function : *overloads) {
+        int score = function->MatchFunction(host, L, 1, 0, true);
+        if (score < best) {
+            best = score;
+            found = 0;
+            candidates[found++] = function;
+        } else if (score == best && found < MaxFunctionCandidates - 1) {
+            candidates[found++] = function;
+        }
+    }
+    if (best != NoMatch && found == 1) {
+        if (host.GetFrame()->Raise)
+            return 0;
+        GenericFunction* function = candidates[0];
+        TemporariesScope scope(host);
+        if (function->Policy)
+            function->Policy->RunBefore(host, L, nullptr);
+        int results = function->Call(host, L);
+        if (function->Policy)
+            results = function->Policy->RunAfter(host, L, nullptr, results);
+        return results;
+    }
+    std::string lines;
+    for (int k = 0; k < found; ++k)
+        lines += candidates[k]->FullName + "(" + candidates[k]->SignatureFunction(host) + ")\n";
+    host.Report("Can't match function to call %s, candidates are:\n%sParameters are:\n%sCaused by: %s.\n",
+                name ? name : "", lines.c_str(), DescribeParameters(L, 1).c_str(), Cause(best));
+    return 0;
+}
+
+// The full class name a cast aims at: a name, or a class table with its tag.
+bool TargetName(lua_State* L, int index, std::string& name)
+{
+    if (lua_type(L, index) == LUA_TSTRING) {
+        name = lua_tostring(L, index);
+        return true;
+    }
+    if (lua_type(L, index) == LUA_TTABLE) {
+        lua_pushstring(L, "__MLUABIND_LUANAMESPACEDESCRIPTIONTAG");
+        lua_rawget(L, index);
+        bool found = lua_type(L, -1) == LUA_TSTRING;
+        if (found)
+            name = lua_tostring(L, -1);
+        lua_pop(L, 1);
+        return found;
+    }
+    return false;
+}
+
+int CastBody(CHost& host, lua_State* L)
+{
+    if (lua_gettop(L) < 2) {
+        host.Report("LuaCast: missings parameters");
+        return 0;
+    }
+    std::string name;
+    if (!TargetName(L, 2, name)) {
+        host.Report("LuaCast: can't retreive target type name");
+        return 0;
+    }
+    GenericClass* target = host.FindClassByName(name);
+    if (!target) {
+        host.Report("LuaCast: can't target generic class for %s", name.c_str());
+        return 0;
+    }
+    LuaCustomVariable* source = ToVariable(L, 1);
+    void* object = source && source->Object ? source->Class->CastTo(host, *target->m_Type, source->Object) : nullptr;
+    if (!object) {
+        lua_pushnil(L);
+        return 1;
+    }
+    CreateVariable(host, L, target, object, false, source->IsConst != 0);
+    return 1;
+}
+
+int CastUnsafeBody(CHost& host, lua_State* L)
+{
+    if (lua_gettop(L) < 2) {
+        host.Report("LuaCastUnsafe: missings parameters");
+        return 0;
+    }
+    std::string name;
+    if (!TargetName(L, 2, name)) {
+        host.Report("LuaCastUnsafe: can't retreive target type name");
+        return 0;
+    }
+    GenericClass* target = host.FindClassByName(name);
+    LuaCustomVariable* source = ToVariable(L, 1);
+    if (!target || (!source && lua_type(L, 1) != LUA_TLIGHTUSERDATA)) {
+        lua_pushnil(L);
+        return 1;
+    }
+    void* object = source ? source->Object : lua_touserdata(L, 1);
+    CreateVariable(host, L, target, object, false, source && source->IsConst);
+    return 1;
+}
+
+int ConstBody(CHost&, lua_State* L)
+{
+    if (LuaCustomVariable* variable = ToVariable(L, 1))
+        variable->IsConst = lua_isnone(L, 2) || lua_toboolean(L, 2) ? 1 : 0;
+    lua_settop(L, 1);
+    return 1;
+}
+
+// Type names for scripts; `extended` adds " const" and " owned", `native` gives the
+// native type name of a bound object.
+int TypeBody(lua_State* L, bool extended, bool native)
+{
+    if (lua_gettop(L) == 0) {
+        lua_pushstring(L, lua_typename(L, LUA_TNONE));
+        return 1;
+    }
+    if (LuaCustomVariable* variable = ToVariable(L, 1)) {
+        std::string text = native ? variable->Class->m_NativeName : variable->Class->FullName;
+        if (extended) {
+            if (variable->IsConst)
+                text += " const";
+            if (variable->IsOwned)
+                text += " owned";
+        }
+        lua_pushlstring(L, text.data(), text.size());
+        return 1;
+    }
+    if (lua_type(L, 1) == LUA_TLIGHTUSERDATA)
+        lua_pushstring(L, "raw pointer");
+    else
+        lua_pushstring(L, lua_typename(L, lua_type(L, 1)));
+    return 1;
+}
+
+int GetTypeBody(CHost&, lua_State* L) { return TypeBody(L, false, false); }
+int GetTypeExBody(CHost&, lua_State* L) { return TypeBody(L, true, false); }
+int GetRttiTypeBody(CHost&, lua_State* L) { return TypeBody(L, false, true); }
+
+} // namespace
+
+int MetaOperatorIndex(lua_State* L)
+{
+    // Fast path without a call frame: a method closure made before for this object.
+    if (lua_type(L, 1) == LUA_TUSERDATA && lua_type(L, 2) == LUA_TSTRING) {
+        lua_getfenv(L, 1);
+        lua_pushvalue(L, 2);
+        lua_rawget(L, -2);
+        if (!lua_isnil(L, -1))
+            return 1;
+        lua_settop(L, 2);
+    }
+    return Entry<&IndexBody>(L);
+}
+int MetaOperatorNewIndex(lua_State* L) { return Entry<&NewIndexBody>(L); }
+int LuaMethodCallProxieFunction(lua_State* L) { return Entry<&MethodCallBody>(L); }
+int LuaOperatorCallProxieFunction(lua_State* L) { return Entry<&OperatorBody>(L); }
+int ConstructorCallDispatcher(lua_State* L) { return Entry<&ConstructorBody>(L); }
+int LuaGlobalFunctionDispatcher(lua_State* L) { return Entry<&FunctionBody>(L); }
+int LuaCast(lua_State* L) { return Entry<&CastBody>(L); }
+int LuaCastUnsafe(lua_State* L) { return Entry<&CastUnsafeBody>(L); }
+int LuaConst(lua_State* L) { return Entry<&ConstBody>(L); }
+int LuaGetType(lua_State* L) { return Entry<&GetTypeBody>(L); }
+int LuaGetTypeEx(lua_State* L) { return Entry<&GetTypeExBody>(L); }
+int LuaGetRttiType(lua_State* L) { return Entry<&GetRttiTypeBody>(L); }
+
+std::string DescribeParameters(lua_State* L, int from)
+{
+    int top = lua_gettop(L);
+    if (top < from)
+        return "None\n";
+    std::string text;
+    for (int index = from; index <= top; ++index) {
+        text += "* ";
+        switch (lua_type(L, index)) {
+        case LUA_TNIL: text += "lua type: nil"; break;
+        case LUA_TBOOLEAN: text += "boolean"; break;
+        case LUA_TLIGHTUSERDATA: text += "raw pointer"; break;
+        case LUA_TNUMBER: text += "number"; break;
+        case LUA_TSTRING: text += "string"; break;
+        case LUA_TTABLE: text += "table"; break;
+        case LUA_TUSERDATA:
+            if (LuaCustomVariable* variable = ToVariable(L, index)) {
+                text += "custom class: ";
+                if (variable->IsConst)
+                    text += "const ";
+                text += variable->Class->FullName;
+            } else {
+                text += "unknown";
+            }
+            break;
+        default: text += "unknown"; break;
+        }
+        text += "\n";
+    }
+    return text;
+}
+
+void ReportMemberConst(CHost& host) { host.Report("MemberClass::PerformNewIndexOperator: can't assign to a const variable.\n"); }
+void ReportMemberNoAssign(CHost& host)
+{
+    host.Report("MemberClass::PerformNewIndexOperator: left value has no assign operator.\n");
+}
+void ReportMemberConvert(CHost& host)
+{
+    host.Report("MemberClass::PerformNewIndexOperator: can't convert a variable to assign.\n");
+}
+void ReportPropertyNoSetter(CHost& host)
+{
+    host.Report("FreePropertyClass::PerformNewIndexOperator: can't assign - no setter available.\n");
+}
+void ReportPropertyConst(CHost& host)
+{
+    host.Report("FreePropertyClass::PerformNewIndexOperator: can't change property at const object.\n");
+}
+void ReportPropertyConvert(CHost& host, lua_State* L, int index)
+{
+    host.Report("FreePropertyClass::PerformNewIndexOperator: can't convert params to call setter.\nParameters are:\n%s",
+                DescribeParameters(L, index).c_str());
+}
+
+const char* OperatorEventName(int index)
+{
+    static const char* const names[] = {"__add", "__sub", "__mul", "__div", "__mod", "__unm",
+                                        "__eq", "__lt", "__le", "__tostring", "__concat", "__call"};
+    return index >= 0 && index < 12 ? names[index] : "__unknown";
+}
+
+} // namespace mluabind::i
