@@ -4,6 +4,7 @@
 #include "core/TimeManager.h"
 #include "diag/Assert.h"
 #include "diag/Log.h"
+#include "lua/Lua.h"
 #include "misc/StringTable.h"
 #include "misc/Unicode.h"
 #include "misc/sys/Path.h"
@@ -143,6 +144,7 @@ void CApplication::Update()
             return;
     }
     m_FrameLimiter.Wait();
+    lua::CLua::StepGarbageCollector();
     GetTimeManager().Update();
     DoUpdate();
     if (m_ShutdownRequested)

@@ -2,6 +2,9 @@
 
 #include "core/SettingsReaders.h"
 #include "diag/Log.h"
+#include "lua/LuaBinding.h"
+#include "lua/LuaHeap.h"
+#include "lua/mluabind/StdBinding.h"
 #include "misc/Unicode.h"
 #include "misc/sys/Path.h"
 
@@ -44,6 +47,7 @@ CApp::~CApp()
 {
     CloseOutput();
     m_GameFolder.clear();
+    m_Lua.reset();
     m_MainTimer.Reset(nullptr);
 }
 
@@ -70,13 +74,23 @@ void CApp::CloseOutput()
     m_OutputRedirected = false;
 }
 
+// The script vocabulary that exists so far: std strings, the Lua host and the file watcher.
+void CApp::BindScripts()
+{
+    m_Lua->BeginBinding();
+    m_Lua->Bind(mluabind::BindStdStrings());
+    m_Lua->Bind(mluabind::Namespace("ox").Merge(lua::BindFileWatcher()).Merge(lua::BindLuaClasses()));
+    m_Lua->EndBinding();
+}
+
 bool CApp::Init()
 {
-    // Later subsystems join the start here, in this order: the Lua heap size, the clip
-    // loader's flag; after the settings files the main script host and the bindings; after
-    // the window the player's options, profiles, music and records; scripts/main.lua and its
-    // Init; then the particle, clip, font, texture and sound declarations, the quest data and
-    // the edit widget's forbidden characters.
+    // Later subsystems join the start here, in this order: the clip loader's flag after the
+    // Lua heap size; the framework's, the game's and the quest engine's script vocabularies
+    // with the main script host; after the window the player's options, profiles, music and
+    // records before scripts/main.lua; after show_fps the particle, clip, font, texture and
+    // sound declarations, the quest data and the edit widget's forbidden characters.
+    lua::SetLuaHeapSize(0xA00000);
     m_Adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
     SetSystemIntegration(m_Adapter.get());
     LimitFPS(50);
@@ -92,6 +106,9 @@ bool CApp::Init()
                              "properties/gui.xml"})
         m_Settings.LoadXml(file);
 
+    m_Lua = std::make_unique<lua::CLua>("main", true);
+    BindScripts();
+
     wstring saves = misc::sys::AppendPath(m_AppDataFolder, u"saves");
     if (!misc::sys::CheckExistPath(saves)) {
         misc::sys::CreateFolder(saves);
@@ -102,6 +119,9 @@ bool CApp::Init()
     // The window opens at the source size until the player's options choose the mode.
     ChangeScreenMode(false, true, kSourceWidth, kSourceHeight);
 
+    m_Lua->LoadScript("scripts/main.lua");
+    lua::CallLuaFunction(m_Lua.get(), "Init");
+
     const core::CSettingsGroup& settings = m_Settings.GetChild("settings");
     g_ShowFps = false;
     core::ReadBool(settings, "show_fps", g_ShowFps);
@@ -110,7 +130,12 @@ bool CApp::Init()
     return true;
 }
 
-void CApp::OnStop() { CApplication::OnStop(); }
+void CApp::OnStop()
+{
+    if (m_Lua)
+        lua::CallLuaFunction(m_Lua.get(), "quest.OnClose");
+    CApplication::OnStop();
+}
 
 void CApp::ProcessEvent()
 {
@@ -128,6 +153,20 @@ void CApp::ProcessEvent()
 
 void CApp::DoDraw(graphics::CRenderer* renderer) { CApplication::DoDraw(renderer); }
 
-void CApp::DoUpdate() { CApplication::DoUpdate(); }
+void CApp::DoUpdate()
+{
+    if (m_Lua) {
+        m_Lua->CheckFileChanges();
+        // The script threads, once the scripts define their manager.
+        lua_State* L = m_Lua->GetLuaState();
+        lua_pushstring(L, "ManageThreads");
+        lua_rawget(L, LUA_GLOBALSINDEX);
+        bool present = lua_isfunction(L, -1);
+        lua_pop(L, 1);
+        if (present)
+            lua::CallLuaFunction(m_Lua.get(), "ManageThreads");
+    }
+    CApplication::DoUpdate();
+}
 
 } // namespace k17

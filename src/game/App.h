@@ -4,6 +4,7 @@
 #include "core/Application.h"
 #include "core/TimeManager.h"
 #include "core/platform/StandaloneApplicationSdl.h"
+#include "lua/Lua.h"
 
 #include <cstdio>
 #include <memory>
@@ -28,6 +29,8 @@ public:
     const ox::wstring& GetGameFolder() const { return m_GameFolder; }
     InitFailure GetInitFailure() const { return m_InitFailure; }
     ox::core::CGroupTimer* GetMainTimer() { return m_MainTimer.Get(); }
+    // The main script host, from Init on.
+    ox::lua::CLua* GetLua() { return m_Lua.get(); }
 
     // The frame-rate limit the debug keys move; starts at 50.
     static unsigned GetFpsLimit();
@@ -36,8 +39,10 @@ public:
 private:
     void RedirectOutput();
     void CloseOutput();
+    void BindScripts();
 
     ox::core::CGroupTimerWrapper m_MainTimer;
+    std::unique_ptr<ox::lua::CLua> m_Lua;
     ox::wstring m_GameFolder;
     // The adapter lives as long as the process, as the platform's own window would.
     std::unique_ptr<ox::core::CStandaloneApplicationSdl> m_Adapter;

@@ -1,0 +1,291 @@
+// The engine's Lua host.
+#include "lua/Lua.h"
+
+#include "core/TimeManager.h"
+#include "diag/Assert.h"
+#include "diag/Log.h"
+#include "diag/Message.h"
+#include "lua/LuaHeap.h"
+#include "misc/GamePack.h"
+#include "misc/Unicode.h"
+
+#include <lfs.h>
+
+#include <cstdarg>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <vector>
+
+namespace ox::lua {
+
+using misc::g_GamePack;
+
+std::map<std::string, CLua*> CLua::m_Luas;
+uint32_t CLua::m_LastGCTime = 0;
+
+namespace {
+
+constexpr size_t kReportCapacity = 65535;
+
+// Compiled chunks are never loaded: the undump of Lua 5.1 trusts its input.
+bool IsPrecompiled(const char* text, size_t size) { return size > 0 && text[0] == LUA_SIGNATURE[0]; }
+
+} // namespace
+
+lua_State* CLua::NewState()
+{
+    lua_State* state = lua_newstate(&CLuaHeap::LuaAlloc, &GetLuaHeap());
+    if (!state) {
+        fprintf(stderr, "cannot create a Lua state on the Lua heap\n");
+        std::abort();
+    }
+    return state;
+}
+
+CLua::CLua(const std::string& id, bool watch_files) : CHost(NewState(), false), m_Id(id)
+{
+    if (watch_files)
+        m_FileWatcher = std::make_unique<misc::CFileWatcher>(true, 1000);
+    luaL_openlibs(L);
+    lua_pushcfunction(L, &luaopen_lfs);
+    lua_call(L, 0, 0);
+    if (!m_Id.empty()) {
+        auto f = m_Luas.find(m_Id);
+        OX_ASSERT(f==m_Luas.end());
+        if (f == m_Luas.end())
+            m_Luas.emplace(m_Id, this);
+    }
+}
+
+CLua::~CLua()
+{
+    if (!m_Id.empty()) {
+        auto it = m_Luas.find(m_Id);
+        if (it != m_Luas.end() && it->second == this)
+            m_Luas.erase(it);
+    }
+    // Every __gc runs here, while the class registry still stands.
+    lua_close(L);
+    L = nullptr;
+    m_FileWatcher.reset();
+}
+
+void CLua::ReportError(const char* format, ...)
+{
+    va_list args;
+    va_start(args, format);
+    std::string text = misc::VFormat(format, args);
+    va_end(args);
+    if (text.size() >= kReportCapacity)
+        text.resize(kReportCapacity - 1);
+    diag::message::Show("Lua Error", text.c_str());
+    OX_LOG("lua", diag::LogError, "%s", text.c_str());
+}
+
+void CLua::ReportLuaError()
+{
+    if (const char* text = lua_tostring(L, -1))
+        ReportError("%s", text);
+    else
+        ReportError("(error object is a %s value)", luaL_typename(L, -1));
+    lua_settop(L, -2);
+}
+
+void CLua::RunScript(const char* text, size_t size, const char* _script)
+{
+    if (IsPrecompiled(text, size)) {
+        OX_LOG("lua", diag::LogError, "%s: a precompiled Lua chunk is refused, scripts are loaded as text only",
+               _script);
+        return;
+    }
+    // Editors may start a UTF-8 file with a byte order mark, which Lua can't read.
+    if (size >= 3 && std::memcmp(text, "\xEF\xBB\xBF", 3) == 0) {
+        text += 3;
+        size -= 3;
+    }
+    int top = lua_gettop(L);
+    int res = luaL_loadbuffer(L, text, size, _script);
+    if (res != 0) {
+        if (res == LUA_ERRSYNTAX)
+            diag::message::Show(misc::Format("failed to load lua file: %s (LUA_ERRSYNTAX)", _script).c_str());
+        else if (res == LUA_ERRMEM)
+            diag::message::Show(misc::Format("failed to load lua file: %s (LUA_ERRMEM)", _script).c_str());
+        const char* message = lua_tostring(L, -1);
+        OX_LOG("lua", diag::LogError, "%s", message ? message : _script);
+        lua_settop(L, top);
+        OX_ASSERT_A(res == 0);
+        return;
+    }
+    PushCurrentHost(this);
+    int status = lua_pcall(L, 0, LUA_MULTRET, 0);
+    PopCurrentHost();
+    if (status != 0)
+        ReportLuaError();
+    lua_settop(L, top);
+}
+
+void CLua::LoadScript(const char* _script)
+{
+    misc::CGamePack& pack = g_GamePack::Instance();
+    OX_ASSERT_A(g_GamePack::Instance().Access(_script));
+    if (!_script)
+        return;
+    unsigned size = 0;
+    if (const void* buffer = pack.Open(_script, &size)) {
+        RunScript(static_cast<const char*>(buffer), size, _script);
+        pack.Close(buffer);
+    }
+    // Also a script that failed: fixing it on disk loads it again.
+    if (m_FileWatcher)
+        m_FileWatcher->WatchFile(misc::ConvertToWide(_script), false);
+}
+
+void CLua::LoadLuaScripts(const char* folder)
+{
+    if (!folder)
+        return;
+    struct Gather {
+        size_t prefix;
+        std::vector<std::string> files;
+    } gather {std::strlen(folder), {}};
+    g_GamePack::Instance().EnumFiles(folder, [](void* user, const char* path) {
+        auto* g = static_cast<Gather*>(user);
+        const char* name = path + std::min(g->prefix, std::strlen(path));
+        // The walk doesn't go into sub-folders; ".lua" may stand anywhere in the name.
+        if (std::strchr(name, '/') == nullptr && std::strstr(name, ".lua") != nullptr)
+            g->files.emplace_back(path);
+    }, &gather);
+    for (const std::string& file : gather.files)
+        LoadScript(file.c_str());
+}
+
+bool CLua::Run(const std::string& code)
+{
+    if (IsPrecompiled(code.data(), code.size())) {
+        OX_LOG("lua", diag::LogError, "CLua::Run: a precompiled Lua chunk is refused, code is run as text only");
+        return false;
+    }
+    int top = lua_gettop(L);
+    PushCurrentHost(this);
+    int status = luaL_loadstring(L, code.c_str());
+    if (status == 0)
+        status = lua_pcall(L, 0, LUA_MULTRET, 0);
+    PopCurrentHost();
+    if (status != 0)
+        ReportLuaError();
+    lua_settop(L, top);
+    return status == 0;
+}
+
+bool CLua::Run(const wstring& code) { return Run(misc::ConvertToNarrow(code)); }
+
+void CLua::CheckFileChanges()
+{
+    if (!m_FileWatcher || !m_FileWatcher->IsFilesChanged())
+        return;
+    for (const wstring& name : m_FileWatcher->GetChangedFiles()) {
+        std::string path = misc::ConvertToNarrow(name);
+        OX_LOG("lua", diag::LogInfo, "%s changed, running it again", path.c_str());
+        LoadScript(path.c_str());
+    }
+    m_FileWatcher->ResetChanges();
+}
+
+CLua* CLua::GetLua(const std::string& id)
+{
+    auto it = m_Luas.find(id);
+    return it == m_Luas.end() ? nullptr : it->second;
+}
+
+void CLua::StepGarbageCollector()
+{
+    uint32_t now = core::g_FrameTime;
+    // Unsigned: a clock that wraps or starts again steps once and goes on from there.
+    if (now - m_LastGCTime > GCPeriod) {
+        m_LastGCTime = now;
+        for (auto& [id, host] : m_Luas)
+            lua_gc(host->L, LUA_GCSTEP, GCStepSize);
+    }
+}
+
+// --- CallLuaFunction ---
+
+namespace detail {
+
+namespace {
+
+// Protected part of the look-up: metamethods of objects may fail.
+int LookUp(lua_State* L)
+{
+    const char* name = lua_tostring(L, 1);
+    lua_pushvalue(L, LUA_GLOBALSINDEX);
+    for (;;) {
+        const char* dot = std::strchr(name, '.');
+        lua_pushlstring(L, name, dot ? static_cast<size_t>(dot - name) : std::strlen(name));
+        lua_gettable(L, -2);
+        lua_remove(L, -2);
+        if (!dot)
+            return 1;
+        int type = lua_type(L, -1);
+        if (type != LUA_TTABLE && type != LUA_TUSERDATA) {
+            lua_pop(L, 1);
+            lua_pushnil(L);
+            return 1;
+        }
+        name = dot + 1;
+    }
+}
+
+} // namespace
+
+bool FindLuaFunction(mluabind::CHost& host, lua_State* L, const char* name)
+{
+    if (!name)
+        return false;
+    lua_pushcfunction(L, &LookUp);
+    lua_pushstring(L, name);
+    mluabind::CHost::PushCurrentHost(&host);
+    int status = lua_pcall(L, 1, 1, 0);
+    mluabind::CHost::PopCurrentHost();
+    if (status != 0 || lua_isnil(L, -1)) {
+        lua_pop(L, 1);
+        return false;
+    }
+    return true;
+}
+
+bool BeginCall(mluabind::CHost& host, lua_State* L, const char* name, int arguments)
+{
+    if (!lua_checkstack(L, arguments + 4)) {
+        host.ReportError("CallLuaFunction: error - no room on the Lua stack to call %s.", name ? name : "");
+        return false;
+    }
+    if (!FindLuaFunction(host, L, name)) {
+        host.ReportError("CallLuaFunction: error - can't find function %s.", name ? name : "");
+        return false;
+    }
+    return true;
+}
+
+bool FinishCall(mluabind::CHost& host, lua_State* L, int arguments, int results)
+{
+    mluabind::CHost::PushCurrentHost(&host);
+    int status = lua_pcall(L, arguments, results, 0);
+    mluabind::CHost::PopCurrentHost();
+    if (status == 0)
+        return true;
+    if (const char* text = lua_tostring(L, -1))
+        host.ReportError("%s", text);
+    lua_pop(L, 1);
+    return false;
+}
+
+void ReportBadResult(mluabind::CHost& host)
+{
+    host.ReportError("CallLuaFunction: return value can't be converted to desired type.");
+}
+
+} // namespace detail
+
+} // namespace ox::lua
