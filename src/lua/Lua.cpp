@@ -141,22 +141,31 @@ void CLua::LoadScript(const char* _script)
         m_FileWatcher->WatchFile(misc::ConvertToWide(_script), false);
 }
 
-void CLua::LoadLuaScripts(const char* folder)
+std::vector<std::string> ListLuaScripts(const misc::CGamePack& pack, const char* folder)
 {
-    if (!folder)
-        return;
     struct Gather {
+        const char* folder;
         size_t prefix;
         std::vector<std::string> files;
-    } gather {std::strlen(folder), {}};
-    g_GamePack::Instance().EnumFiles(folder, [](void* user, const char* path) {
+    } gather {folder, folder ? std::strlen(folder) : 0, {}};
+    if (!folder)
+        return {};
+    pack.EnumFiles(folder, [](void* user, const char* path) {
         auto* g = static_cast<Gather*>(user);
         const char* name = path + std::min(g->prefix, std::strlen(path));
+        // The folder's own separator, when the caller left it out.
+        if (*name == '/' && g->prefix > 0 && g->folder[g->prefix - 1] != '/')
+            ++name;
         // The walk doesn't go into sub-folders; ".lua" may stand anywhere in the name.
         if (std::strchr(name, '/') == nullptr && std::strstr(name, ".lua") != nullptr)
             g->files.emplace_back(path);
     }, &gather);
-    for (const std::string& file : gather.files)
+    return gather.files;
+}
+
+void CLua::LoadLuaScripts(const char* folder)
+{
+    for (const std::string& file : ListLuaScripts(g_GamePack::Instance(), folder))
         LoadScript(file.c_str());
 }
 

@@ -15,6 +15,11 @@
 #include <string>
 #include <type_traits>
 #include <utility>
+#include <vector>
+
+namespace ox::misc {
+class CGamePack;
+}
 
 namespace ox::lua {
 
@@ -63,6 +68,10 @@ private:
     static uint32_t m_LastGCTime;
 };
 
+// The scripts LoadLuaScripts runs: the files directly in `folder` (not in its sub-folders)
+// whose name holds ".lua" anywhere, in the pack's order.
+std::vector<std::string> ListLuaScripts(const misc::CGamePack& pack, const char* folder);
+
 // --- calling Lua functions from native code ---
 
 namespace detail {
@@ -79,12 +88,13 @@ void ReportBadResult(mluabind::CHost& host);
 template <class A>
 void PushArgument(mluabind::CHost& host, lua_State* L, const A& value)
 {
-    using D = std::decay_t<A>;
     int pushed;
-    if constexpr (std::is_array_v<A>)
-        pushed = mluabind::PushValue<D>(host, L, static_cast<D>(value));
-    else
-        pushed = mluabind::PushValue<D>(host, L, value);
+    if constexpr (std::is_array_v<A>) {
+        using P = const std::remove_extent_t<A>*;
+        pushed = mluabind::PushValue<P>(host, L, static_cast<P>(value));
+    } else {
+        pushed = mluabind::PushValue<std::decay_t<A>>(host, L, value);
+    }
     // A value that couldn't be pushed (reported) still takes its slot.
     if (pushed == 0)
         lua_pushnil(L);

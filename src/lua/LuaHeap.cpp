@@ -148,12 +148,12 @@ void CLuaHeap::Free(void* pointer)
 
 void* CLuaHeap::Reallocate(void* pointer, size_t size)
 {
-    if (!pointer)
-        return Allocate(size);
     if (size == 0) {
         Free(pointer);
         return nullptr;
     }
+    if (!pointer)
+        return Allocate(size);
     size_t old = BlockSize(pointer);
     size_t wanted = RoundUp(size);
     if (old >= wanted && old - wanted < old / 8)

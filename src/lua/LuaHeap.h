@@ -42,7 +42,7 @@ public:
     // nothing fits.
     void* Allocate(size_t size);
     void Free(void* pointer);
-    // Null allocates, size 0 frees (and gives null). A block that already fits with less
+    // Size 0 frees (and gives null), null allocates. A block that already fits with less
     // than an eighth of it to spare is kept; otherwise the contents move to a new block.
     void* Reallocate(void* pointer, size_t size);
 
