@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include <chrono>
+#include <fstream>
 #include <thread>
 
 namespace fs = std::filesystem;
@@ -56,6 +57,19 @@ struct GameRun {
     }
 
     std::string Log() const { return oxtest::ReadFile(data / "Lanternfold" / "Lantern Demo" / "log.oxlog"); }
+    std::string Output() const { return oxtest::ReadFile(game / "k17_stdout.txt"); }
+
+    // Waits until the game's standard output holds `text`.
+    bool WaitForOutput(const std::string& text, std::chrono::milliseconds limit) const
+    {
+        auto end = std::chrono::steady_clock::now() + limit;
+        while (std::chrono::steady_clock::now() < end) {
+            if (Output().find(text) != std::string::npos)
+                return true;
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+        }
+        return false;
+    }
 
     ~GameRun()
     {
@@ -88,6 +102,22 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
         std::this_thread::sleep_for(std::chrono::milliseconds(50));
     std::this_thread::sleep_for(std::chrono::milliseconds(300));
     ASSERT_EQ(run.WaitExit(std::chrono::milliseconds(0)), -1) << "the game ended by itself:\n" << run.Log();
+    // scripts/main.lua ran and its Init was called once the window was up.
+    EXPECT_TRUE(run.WaitForOutput("Lantern Demo Init: Lua 5.1 in host 'main', lfs present", std::chrono::seconds(5)))
+        << run.Output();
+
+    // Editing the main script while the game runs runs it again in the same state: what
+    // Init stored is still there.
+    fs::path script = run.game / "scripts" / "main.lua";
+    fs::path edited = run.game / "scripts" / "main.lua.edited";
+    {
+        std::ofstream out(edited, std::ios::binary);
+        out << oxtest::ReadFile(script) << "\nprint(\"Lantern Demo reloaded in host \" .. tostring(lantern.host))\n";
+    }
+    fs::last_write_time(edited, fs::file_time_type::clock::now() + std::chrono::seconds(5));
+    fs::rename(edited, script);
+    EXPECT_TRUE(run.WaitForOutput("Lantern Demo reloaded in host main", std::chrono::seconds(5)))
+        << run.Output() << run.Log();
 
     {
         GameRun second;
@@ -103,8 +133,10 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_TRUE(LogHasInOrder(log, {"[app][1]: app created", "[app][1]: app init...", "[app][1]: app init complete...",
                                     "[app][1]: app destroyed"}))
         << log;
-    EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
-    EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
+    EXPECT_NE(run.Output().find("Lantern Demo quest.OnClose: the lantern goes out"), std::string::npos)
+        << run.Output();
+    std::string errors = oxtest::ReadFile(run.game / "k17_stderr.txt");
+    EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
 }
 
 TEST(GameHeadless, NoDisplayIsAClearErrorAndANonZeroExit)

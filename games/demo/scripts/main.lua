@@ -15,8 +15,8 @@ local function text(value)
 end
 
 function Init()
-    local host = ox.lua.CLua.GetLua("main")
-    print("Lantern Demo Init: " .. _VERSION .. " in host '" .. text(host.GetId()) .. "', lfs " ..
+    lantern.host = text(ox.lua.CLua.GetLua("main").GetId())
+    print("Lantern Demo Init: " .. _VERSION .. " in host '" .. lantern.host .. "', lfs " ..
           (lfs and "present" or "missing"))
 end
 
