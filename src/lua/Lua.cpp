@@ -213,8 +213,15 @@ void CLua::StepGarbageCollector()
     // Unsigned: a clock that wraps or starts again steps once and goes on from there.
     if (now - m_LastGCTime > GCPeriod) {
         m_LastGCTime = now;
+        // A step may finalise a host that a script made, which takes it off the list.
+        std::vector<CLua*> hosts;
         for (auto& [id, host] : m_Luas)
-            lua_gc(host->L, LUA_GCSTEP, GCStepSize);
+            hosts.push_back(host);
+        for (CLua* host : hosts) {
+            auto listed = m_Luas.find(host->m_Id);
+            if (listed != m_Luas.end() && listed->second == host)
+                lua_gc(host->L, LUA_GCSTEP, GCStepSize);
+        }
     }
 }
 
