@@ -214,11 +214,9 @@ void CLua::StepGarbageCollector()
     if (now - m_LastGCTime > GCPeriod) {
         m_LastGCTime = now;
         // A step may finalise a host that a script made, which takes it off the list.
-        std::vector<CLua*> hosts;
-        for (auto& [id, host] : m_Luas)
-            hosts.push_back(host);
-        for (CLua* host : hosts) {
-            auto listed = m_Luas.find(host->m_Id);
+        std::vector<std::pair<std::string, CLua*>> hosts(m_Luas.begin(), m_Luas.end());
+        for (auto& [id, host] : hosts) {
+            auto listed = m_Luas.find(id);
             if (listed != m_Luas.end() && listed->second == host)
                 lua_gc(host->L, LUA_GCSTEP, GCStepSize);
         }
