@@ -304,6 +304,11 @@ void CRenderer::DrawVertices(PrimitiveType type, CDeviceTexture* texture, Vertex
     } else if (count < 3) {
         return;
     }
+    Submit(type, texture, v, count);
+}
+
+void CRenderer::Submit(PrimitiveType type, CDeviceTexture* texture, const Vertex* v, unsigned count)
+{
     m_Device->SetPixelShader(m_State.GetPixelShader());
     m_Device->SetBlendMode(m_State.GetBlendMode());
     m_Device->SetTexture(0, texture);
@@ -344,15 +349,30 @@ void CRenderer::RenderFilledPoly4(const Poly4& poly, const Color& color)
 
 void CRenderer::DrawRectQuad(CDeviceTexture* texture, const FloatRect& d, const UVRect& uv, uint32_t diffuse)
 {
+    // The four corners are transformed once; without a clip the half-pixel shift goes with
+    // them (the same arithmetic as shifting afterwards).
+    const misc::FloatMatrix& m = m_State.GetTransform();
+    const bool clip = m_State.GetClipPoly() != nullptr;
+    const float shift = clip ? 0.0f : 0.5f;
     const float r = d.X + d.Width, b = d.Y + d.Height;
+    auto corner = [&](float x, float y, float u, float v) {
+        return MakeVertex(x * m.m[0][0] + y * m.m[1][0] + m.m[2][0] - shift,
+                          x * m.m[0][1] + y * m.m[1][1] + m.m[2][1] - shift, diffuse, u, v);
+    };
     Vertex v[MaxClipVertices];
-    v[0] = MakeVertex(d.X, d.Y, diffuse, uv.u1, uv.v1);
-    v[1] = MakeVertex(r, d.Y, diffuse, uv.u2, uv.v1);
-    v[2] = MakeVertex(d.X, b, diffuse, uv.u1, uv.v2);
+    v[0] = corner(d.X, d.Y, uv.u1, uv.v1);
+    v[1] = corner(r, d.Y, uv.u2, uv.v1);
+    v[2] = corner(d.X, b, uv.u1, uv.v2);
     v[3] = v[2];
     v[4] = v[1];
-    v[5] = MakeVertex(r, b, diffuse, uv.u2, uv.v2);
-    DrawVertices(PrimitiveTriangleList, texture, v, 6);
+    v[5] = corner(r, b, uv.u2, uv.v2);
+    unsigned count = 6;
+    if (clip) {
+        m_State.ClipAndShift(v, count, false);
+        if (count < 3)
+            return;
+    }
+    Submit(PrimitiveTriangleList, texture, v, count);
 }
 
 void CRenderer::DrawPolyQuad(CDeviceTexture* texture, const Poly4& p, const UVRect& uv, uint32_t diffuse)

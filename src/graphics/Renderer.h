@@ -152,6 +152,8 @@ private:
     // The vertex colour for a draw, or false when nothing is to be drawn.
     bool Preamble(const Color& color, uint32_t& diffuse) const;
     void DrawVertices(PrimitiveType type, CDeviceTexture* texture, Vertex* vertices, unsigned count);
+    // Transformed and clipped vertices to the device with the current state.
+    void Submit(PrimitiveType type, CDeviceTexture* texture, const Vertex* vertices, unsigned count);
     void DrawRectQuad(CDeviceTexture* texture, const misc::FloatRect& dest, const UVRect& uv, uint32_t diffuse);
     void DrawPolyQuad(CDeviceTexture* texture, const misc::Poly4& dest, const UVRect& uv, uint32_t diffuse);
     void DrawBox(const CTexture* texture, const misc::FloatRect& dest, const UVRect& uv, uint32_t diffuse);

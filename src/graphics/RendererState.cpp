@@ -22,17 +22,20 @@ void CRendererState::ResetFrame()
     m_ColorStack.Push(Color(0xFFFFFFFFu));
     m_BlendStack.Push(BlendNormal);
     m_ShaderStack.Push(nullptr);
+    m_TransformValid = false;
 }
 
 void CRendererState::ApplyMatrix(const FloatMatrix& m)
 {
     FloatMatrix& top = m_MatrixStack.GetTop();
     top = m * top;
+    m_TransformValid = false;
 }
 
 void CRendererState::SetAspectMatrix(const FloatVector& scale, const FloatVector& offset)
 {
     m_AspectMatrix = misc::MatrixScale(scale.X, scale.Y) * misc::MatrixTranslation(offset.X, offset.Y);
+    m_TransformValid = false;
 }
 
 void CRendererState::PushState()
@@ -53,11 +56,12 @@ void CRendererState::PopState()
         m_ClipStack.Pop();
     m_ColorStack.Pop();
     m_MatrixStack.Pop();
+    m_TransformValid = false;
 }
 
 void CRendererState::SetClipPoly(const misc::Poly4& poly)
 {
-    const FloatMatrix m = m_MatrixStack.GetTop() * m_AspectMatrix;
+    const FloatMatrix& m = GetTransform();
     ClipPolygon clip;
     for (int i = 0; i < 4; ++i)
         clip.PushBack(m.Transform(poly[i]));
@@ -88,7 +92,7 @@ void CRendererState::SetClipPoly(const misc::Poly4& poly)
 
 void CRendererState::TransformVertices(Vertex* v, unsigned& count, bool skipClip) const
 {
-    const FloatMatrix m = m_MatrixStack.GetTop() * m_AspectMatrix;
+    const FloatMatrix& m = GetTransform();
     const float m00 = m.m[0][0], m01 = m.m[0][1], m10 = m.m[1][0], m11 = m.m[1][1], m20 = m.m[2][0],
                 m21 = m.m[2][1];
     for (unsigned i = 0; i < count; ++i) {
@@ -96,6 +100,11 @@ void CRendererState::TransformVertices(Vertex* v, unsigned& count, bool skipClip
         v[i].x = x * m00 + y * m10 + m20;
         v[i].y = x * m01 + y * m11 + m21;
     }
+    ClipAndShift(v, count, skipClip);
+}
+
+void CRendererState::ClipAndShift(Vertex* v, unsigned& count, bool skipClip) const
+{
     if (!skipClip)
         ClipVertices(v, count);
     for (unsigned i = 0; i < count; ++i) {

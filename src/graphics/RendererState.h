@@ -106,7 +106,11 @@ public:
     void PushState();
     void PopState();
     void PushMatrix() { m_MatrixStack.Push(m_MatrixStack.GetTop()); }
-    void PopMatrix() { m_MatrixStack.Pop(); }
+    void PopMatrix()
+    {
+        m_MatrixStack.Pop();
+        m_TransformValid = false;
+    }
     void PushBlendMode() { m_BlendStack.Push(m_BlendStack.GetTop()); }
     void PopBlendMode() { m_BlendStack.Pop(); }
     void PushColor() { m_ColorStack.Push(m_ColorStack.GetTop()); }
@@ -115,12 +119,23 @@ public:
     // The aspect matrix := scale * translate.
     void SetAspectMatrix(const misc::FloatVector& scale, const misc::FloatVector& offset);
     const misc::FloatMatrix& GetAspectMatrix() const { return m_AspectMatrix; }
+    // The current matrix followed by the aspect matrix: source units to window pixels.
+    const misc::FloatMatrix& GetTransform() const
+    {
+        if (!m_TransformValid) {
+            m_Transform = m_MatrixStack.GetTop() * m_AspectMatrix;
+            m_TransformValid = true;
+        }
+        return m_Transform;
+    }
 
     // Matrix, aspect, clip (unless skipped) and the half-pixel shift, in place. `count` may
     // fall, to 0 when nothing is left; the buffer holds MaxClipVertices.
     void TransformVertices(Vertex* vertices, unsigned& count, bool skipClip) const;
     // Cuts a list of triangles (or one line of two vertices) to the clip polygon.
     void ClipVertices(Vertex* vertices, unsigned& count) const;
+    // The steps after the transform: clip (unless skipped), then the half-pixel shift.
+    void ClipAndShift(Vertex* vertices, unsigned& count, bool skipClip) const;
 
     // Sutherland-Hodgman: `subject` cut by the convex `clip`, into `out`.
     static void IntersectPolygons(const ClipPolygon& clip, const ClipPolygon& subject, ClipPolygon& out);
@@ -132,6 +147,8 @@ private:
     BoundedStack<BlendModes> m_BlendStack;
     BoundedStack<const CPixelShader*> m_ShaderStack;
     misc::FloatMatrix m_AspectMatrix;
+    mutable misc::FloatMatrix m_Transform;
+    mutable bool m_TransformValid = false;
 };
 
 } // namespace ox::graphics
