@@ -12,6 +12,7 @@ namespace ox::graphics {
 namespace {
 
 IRenderBackend* g_Backend = nullptr;
+RenderDevice* g_Device = nullptr;
 
 struct PrimitiveInfo {
     unsigned vertsPerPrimitive;
@@ -50,6 +51,8 @@ BlendFactors BlendTable(uint32_t mode)
 
 IRenderBackend* GetRenderBackend() { return g_Backend; }
 void SetRenderBackend(IRenderBackend* backend) { g_Backend = backend; }
+RenderDevice* GetRenderDevice() { return g_Device; }
+void SetRenderDevice(RenderDevice* device) { g_Device = device; }
 
 bool CheckResult(DeviceResult result, const char* what, int level)
 {
@@ -240,6 +243,34 @@ void RenderDevice::Draw(PrimitiveType type, const Vertex* vertices, unsigned cou
     }
     Append(vertices, count);
     m_StatesChanged = false;
+}
+
+void RenderDevice::ForgetTexture(CDeviceTexture* texture)
+{
+    if (!texture)
+        return;
+    bool used = m_WantedTarget == texture || m_AppliedTarget == texture;
+    for (unsigned s = 0; s < StagesCount; ++s)
+        used = used || m_Wanted[s].Texture == texture || m_Applied[s].Texture == texture;
+    if (!used)
+        return;
+    Flush();
+    for (unsigned s = 0; s < StagesCount; ++s) {
+        if (m_Wanted[s].Texture == texture)
+            SetTexture(s, nullptr);
+        if (m_Applied[s].Texture == texture) {
+            if (m_Backend)
+                m_Backend->SetTexture(s, nullptr);
+            m_Applied[s].Texture = nullptr;
+        }
+    }
+    if (m_WantedTarget == texture)
+        SetRenderTarget(nullptr);
+    if (m_AppliedTarget == texture) {
+        if (m_Backend)
+            m_Backend->SetRenderTarget(nullptr);
+        m_AppliedTarget = nullptr;
+    }
 }
 
 void RenderDevice::Flush()

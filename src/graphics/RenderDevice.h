@@ -15,6 +15,10 @@ class CPixelShader;
 // (surfaces, shaders). Null while no renderer exists.
 IRenderBackend* GetRenderBackend();
 void SetRenderBackend(IRenderBackend* backend);
+class RenderDevice;
+// The render device of the one renderer; null while none exists.
+RenderDevice* GetRenderDevice();
+void SetRenderDevice(RenderDevice* device);
 
 struct Stage {
     static constexpr unsigned StatesCount = 25;
@@ -53,6 +57,9 @@ public:
     // A render-target texture, or null for the back buffer.
     void SetRenderTarget(CDeviceTexture* target);
     void Draw(PrimitiveType type, const Vertex* vertices, unsigned count);
+    // A texture is about to go: what is batched with it is drawn, and no state refers to it
+    // any longer (a new texture may get its address).
+    void ForgetTexture(CDeviceTexture* texture);
 
     void StartSnapshot() { m_Snapshot = true; }
     bool IsSnapshot() const { return m_Snapshot; }

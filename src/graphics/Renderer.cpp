@@ -20,6 +20,7 @@ CRenderer::CRenderer(std::unique_ptr<IRenderBackend> backend)
     : m_Backend(std::move(backend)), m_Device(std::make_unique<RenderDevice>(m_Backend.get()))
 {
     SetRenderBackend(m_Backend.get());
+    SetRenderDevice(m_Device.get());
 }
 
 CRenderer::~CRenderer()
@@ -27,6 +28,8 @@ CRenderer::~CRenderer()
     ReleaseDevice(false);
     if (GetRenderBackend() == m_Backend.get())
         SetRenderBackend(nullptr);
+    if (GetRenderDevice() == m_Device.get())
+        SetRenderDevice(nullptr);
 }
 
 void CRenderer::SetBackend(std::unique_ptr<IRenderBackend> backend)

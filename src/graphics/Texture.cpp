@@ -97,6 +97,8 @@ bool CSurface::CreateDeviceTexture()
 void CSurface::ReleaseD3D()
 {
     if (Surface) {
+        if (RenderDevice* device = GetRenderDevice())
+            device->ForgetTexture(Surface);
         if (IRenderBackend* backend = GetRenderBackend())
             backend->ReleaseTexture(Surface);
         Surface = nullptr;

@@ -279,6 +279,17 @@ TEST_F(TextureFixture, ClipAndMatrixReachTheVertices)
     EXPECT_FLOAT_EQ(maxX, 19.5f) << "cut at the clip's right edge";
     EXPECT_FLOAT_EQ(minU, 0.0f);
     EXPECT_FLOAT_EQ(maxU, 0.25f) << "half the frame's U range is left";
+    // A line across a rotated clip keeps only its part inside, as one line.
+    renderer->PushState();
+    renderer->SetClipPoly(Poly4 {{{50, 20}, {80, 50}, {50, 80}, {20, 50}}});
+    backend->ClearRecord();
+    renderer->RenderLine({0, 50}, {100, 50});
+    auto line = Drawn();
+    renderer->PopState();
+    ASSERT_EQ(line.size(), 2u);
+    EXPECT_NEAR(std::min(line[0].x, line[1].x), 19.5f, 1e-3);
+    EXPECT_NEAR(std::max(line[0].x, line[1].x), 79.5f, 1e-3);
+
     // After the pop nothing clips or moves.
     backend->ClearRecord();
     renderer->RenderTexture(texture.get(), FloatRect(0, 0, 40, 40));
