@@ -42,6 +42,7 @@ CApp::CApp() = default;
 
 CApp::~CApp()
 {
+    m_Demo.reset();
     CloseOutput();
     m_GameFolder.clear();
     m_MainTimer.Reset(nullptr);
@@ -101,6 +102,7 @@ bool CApp::Init()
     m_Renderer.SetSourceResolution(kSourceWidth, kSourceHeight);
     // The window opens at the source size until the player's options choose the mode.
     ChangeScreenMode(false, true, kSourceWidth, kSourceHeight);
+    m_Demo = std::make_unique<CDemoScene>(m_Renderer);
 
     const core::CSettingsGroup& settings = m_Settings.GetChild("settings");
     g_ShowFps = false;
@@ -126,7 +128,12 @@ void CApp::ProcessEvent()
     CApplication::ProcessEvent();
 }
 
-void CApp::DoDraw(graphics::CRenderer* renderer) { CApplication::DoDraw(renderer); }
+void CApp::DoDraw(graphics::CRenderer* renderer)
+{
+    CApplication::DoDraw(renderer);
+    if (m_Demo)
+        m_Demo->Draw(*renderer, m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
+}
 
 void CApp::DoUpdate() { CApplication::DoUpdate(); }
 
