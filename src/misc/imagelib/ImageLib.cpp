@@ -54,6 +54,7 @@ bool CImageDecoder::GetInfoFromFile(const char* path, uint32_t& width, uint32_t&
 
 bool CImageDecoder::DecodeFromFile(const char* path, Image& image)
 {
+    image = Image{};
     m_Name = path;
     bool result = WithFile(path, [&](const void* data, unsigned size) { return Decode(data, size, image); });
     m_Name.clear();

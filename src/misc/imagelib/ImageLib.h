@@ -36,8 +36,9 @@ public:
     virtual bool DecodeFromFile(const char* path, Image& image);
     virtual ~CImageDecoder() = default;
 
-    // The name log lines give the source; "<memory>" unless a file is being read.
+    // The name log lines give the source: the file being read, the name set, or "<memory>".
     const char* SourceName() const { return m_Name.empty() ? "<memory>" : m_Name.c_str(); }
+    void SetName(std::string name) { m_Name = std::move(name); }
 
 protected:
     void SetSource(const void* data, size_t size);
