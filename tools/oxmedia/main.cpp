@@ -42,7 +42,7 @@ const char* kPngHelp =
     "grey also takes 1, 2 or 4. --interlace writes Adam7 interlacing.\n";
 
 const char* kJpegHelp =
-    "usage: oxmedia jpeg <out.jpg> [--size WxH] [--pattern NAME] [--quality Q] [--grey]\n"
+    "usage: oxmedia jpeg <out.jpg> [--size WxH] [--pattern NAME] [--quality Q] [--grey] [--progressive]\n"
     "\n"
     "Writes a generated image as JPEG (RGB, or one grey channel with --grey); alpha is\n"
     "dropped. --quality 0 to 100, default 90. Sizes and patterns as for png.\n";
@@ -265,12 +265,12 @@ int Jpeg(int argc, char** argv)
 {
     Generated g;
     int quality = 90;
-    bool grey = false;
+    bool grey = false, progressive = false;
     std::vector<std::string> files;
     std::string error;
     bool ok = Options(argc, argv, 2, files, [&](const std::string& arg, const char* value) {
-        if (arg == "--grey") {
-            grey = true;
+        if (arg == "--grey" || arg == "--progressive") {
+            (arg == "--grey" ? grey : progressive) = true;
             return 0;
         }
         if (arg == "--quality") {
@@ -291,7 +291,7 @@ int Jpeg(int argc, char** argv)
     if (!MakePixels(g, pixels))
         return 1;
     std::vector<uint8_t> jpeg;
-    if (!EncodeJpeg(pixels.data(), g.width, g.height, quality, jpeg, grey))
+    if (!EncodeJpeg(pixels.data(), g.width, g.height, quality, jpeg, grey, progressive))
         return 1;
     return Write(files[0], jpeg) ? 0 : 1;
 }

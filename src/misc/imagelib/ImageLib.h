@@ -86,10 +86,10 @@ bool GetImageInfo(const char* path, uint32_t& width, uint32_t& height);
 // Decodes an image file; a path without any '.' is a contract failure.
 bool LoadImage(const char* path, Image& image);
 
-// Encodes RGB JPEG data (alpha is dropped; `grey` writes one channel of luma).
-// The quality is capped at 100.
+// Encodes RGB JPEG data (alpha is dropped; `grey` writes one channel of luma,
+// `progressive` a progressive file). The quality is capped at 100.
 bool EncodeJpeg(const uint32_t* pixels, uint32_t width, uint32_t height, int quality,
-                std::vector<uint8_t>& out, bool grey = false);
+                std::vector<uint8_t>& out, bool grey = false, bool progressive = false);
 // Writes an RGB JPEG file (a UTF-8 path on disk).
 bool CompressJpegFile(const char* path, const uint32_t* pixels, uint32_t width, uint32_t height, int quality);
 

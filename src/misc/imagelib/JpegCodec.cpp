@@ -250,7 +250,8 @@ struct CompressState {
     bool created;
 };
 
-bool Compress(CompressState* s, const uint32_t* pixels, uint32_t width, uint32_t height, int quality, bool grey)
+bool Compress(CompressState* s, const uint32_t* pixels, uint32_t width, uint32_t height, int quality, bool grey,
+              bool progressive)
 {
     if (setjmp(s->err.jump))
         return false;
@@ -265,6 +266,8 @@ bool Compress(CompressState* s, const uint32_t* pixels, uint32_t width, uint32_t
     if (grey)
         jpeg_set_colorspace(&s->cinfo, JCS_GRAYSCALE);
     jpeg_set_quality(&s->cinfo, quality, TRUE);
+    if (progressive)
+        jpeg_simple_progression(&s->cinfo);
     jpeg_start_compress(&s->cinfo, TRUE);
     JSAMPARRAY line = (*s->cinfo.mem->alloc_sarray)(reinterpret_cast<j_common_ptr>(&s->cinfo), JPOOL_IMAGE,
                                                     width * 3, 1);
@@ -285,7 +288,7 @@ bool Compress(CompressState* s, const uint32_t* pixels, uint32_t width, uint32_t
 } // namespace
 
 bool EncodeJpeg(const uint32_t* pixels, uint32_t width, uint32_t height, int quality, std::vector<uint8_t>& out,
-                bool grey)
+                bool grey, bool progressive)
 {
     out.clear();
     if (!pixels || width == 0 || height == 0 || width > 65500 || height > 65500) {
@@ -296,7 +299,7 @@ bool EncodeJpeg(const uint32_t* pixels, uint32_t width, uint32_t height, int qua
     memset(&state, 0, sizeof(state));
     InstallErrorManager(state.err, "<memory>");
     state.cinfo.err = &state.err.pub;
-    bool ok = Compress(&state, pixels, width, height, std::clamp(quality, 0, 100), grey);
+    bool ok = Compress(&state, pixels, width, height, std::clamp(quality, 0, 100), grey, progressive);
     if (state.created)
         jpeg_destroy_compress(&state.cinfo);
     // The memory destination hands its final block over only when it finishes; after an
