@@ -48,6 +48,15 @@ enum TextureAlphaDescOffset : size_t {
     kDescUniformValue = 109,
     kDescOrder = 110,
 };
+// The id string makes the record a non-standard-layout type; its layout is still fixed.
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Winvalid-offsetof"
+static_assert(offsetof(TextureAlphaDesc, width) == kDescWidth && offsetof(TextureAlphaDesc, height) == kDescHeight &&
+              offsetof(TextureAlphaDesc, offset) == kDescOffset && offsetof(TextureAlphaDesc, size) == kDescSize &&
+              offsetof(TextureAlphaDesc, uniform) == kDescUniform &&
+              offsetof(TextureAlphaDesc, uniform_value) == kDescUniformValue &&
+              offsetof(TextureAlphaDesc, order) == kDescOrder);
+#pragma GCC diagnostic pop
 
 // A run: bits 0..14 its length in pixels, bit 15 the answer.
 constexpr uint16_t kRunValueBit = 0x8000;
