@@ -160,7 +160,27 @@ void CApplication::Draw()
     if (!m_Renderer.BeginScene())
         return;
     DoDraw(&m_Renderer);
+    DrawLetterbox();
     m_Renderer.EndScene();
+}
+
+void CApplication::DrawLetterbox()
+{
+    // Opaque bars over what the canvas does not cover, in source units.
+    const misc::FloatRect active = m_Renderer.GetActiveRect();
+    const misc::FloatVector scale = m_Renderer.GetScale();
+    const misc::IntVector source = m_Renderer.GetSourceResolution();
+    const float sw = static_cast<float>(source.X), sh = static_cast<float>(source.Y);
+    const graphics::Color black(0xFF000000u);
+    if (active.X > 0) {
+        const float w = active.X / scale.X;
+        m_Renderer.RenderFilledPoly4(misc::RectToPoly4({-w, 0, w, sh}), black);
+        m_Renderer.RenderFilledPoly4(misc::RectToPoly4({sw, 0, w, sh}), black);
+    } else if (active.Y > 0) {
+        const float h = active.Y / scale.Y;
+        m_Renderer.RenderFilledPoly4(misc::RectToPoly4({0, -h, sw, h}), black);
+        m_Renderer.RenderFilledPoly4(misc::RectToPoly4({0, sh, sw, h}), black);
+    }
 }
 
 void CApplication::DoDraw(graphics::CRenderer* /*renderer*/) {}

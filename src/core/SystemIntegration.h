@@ -50,6 +50,8 @@ public:
     virtual bool IsCursorVisible() = 0;
     // Confines the mouse to a rectangle of the window's client area; null frees it.
     virtual void ClipCursor(const IntRect* clientRect) = 0;
+    // The platform window the render device draws into (an SDL_Window*); null without one.
+    virtual void* GetWindowHandle() { return nullptr; }
 
     // Who the loop calls back, and the names the single-instance lock and the window use
     // (the lock lives in the user's data folder of the game).

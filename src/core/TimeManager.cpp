@@ -37,11 +37,11 @@ CPlatformTimer::CPlatformTimer(Source source) : m_Source(std::move(source)), m_B
     OX_LOG("core", diag::LogInfo, "Time system choose monotonic clock");
 }
 
-// ---- CTimer ----
+// ---- shared clock ----
 
-void CTimer::SetK(float _k) { m_K = WholeSpeed(_k); }
+void CTimerClock::SetK(float _k) { m_K = WholeSpeed(_k); }
 
-void CTimer::Pause(bool flag)
+void CTimerClock::Pause(bool flag)
 {
     if (flag)
         ++m_PauseCount;
@@ -49,9 +49,7 @@ void CTimer::Pause(bool flag)
         --m_PauseCount;
 }
 
-void CTimer::Destroy() { m_Manager->RemoveTimer(this); }
-
-void CTimer::Update(int step)
+void CTimerClock::Advance(int step)
 {
     if (m_PauseCount) {
         m_FrameDelta = 0;
@@ -60,6 +58,18 @@ void CTimer::Update(int step)
     m_FrameDelta = static_cast<int16_t>(m_K * step);
     m_Time += static_cast<int32_t>(m_FrameDelta);
 }
+
+void CTimerClock::CopyClock(const CTimerClock& other)
+{
+    m_Time = other.m_Time;
+    m_FrameDelta = other.m_FrameDelta;
+    m_PauseCount = other.m_PauseCount;
+    m_K = other.m_K;
+}
+
+// ---- CTimer ----
+
+void CTimer::Destroy() { m_Manager->RemoveTimer(this); }
 
 void CTimer::SetParent(CGroupTimer* parent)
 {
@@ -73,17 +83,14 @@ void CTimer::SetParent(CGroupTimer* parent)
 CTimer* CTimer::Clone(CGroupTimer* parent) const
 {
     CTimer* copy = m_Manager->AttachTimer(parent ? parent : m_Parent);
-    copy->m_Time = m_Time;
-    copy->m_FrameDelta = m_FrameDelta;
-    copy->m_PauseCount = m_PauseCount;
-    copy->m_K = m_K;
+    copy->CopyClock(*this);
     return copy;
 }
 
 // ---- CGroupTimer ----
 
 CGroupTimer::CGroupTimer(CTimeManager* manager, const char* id, CGroupTimer* parent)
-    : m_Manager(manager), m_Id(id ? id : ""), m_Parent(parent)
+    : CTimerClock(manager, parent), m_Id(id ? id : "")
 {
 }
 
@@ -101,26 +108,11 @@ CGroupTimer* CGroupTimer::GetChildGroupTimer(const char* id) const
     return nullptr;
 }
 
-void CGroupTimer::SetK(float _k) { m_K = WholeSpeed(_k); }
-
-void CGroupTimer::Pause(bool flag)
-{
-    if (flag)
-        ++m_PauseCount;
-    else if (m_PauseCount)
-        --m_PauseCount;
-}
-
 void CGroupTimer::Destroy() { m_Manager->RemoveGroupTimer(this); }
 
 void CGroupTimer::Update(int step)
 {
-    if (m_PauseCount) {
-        m_FrameDelta = 0;
-    } else {
-        m_FrameDelta = static_cast<int16_t>(m_K * step);
-        m_Time += static_cast<int32_t>(m_FrameDelta);
-    }
+    Advance(step);
     for (CTimer* timer : m_ChildTimers)
         timer->Update(m_FrameDelta);
     for (CGroupTimer* group : m_ChildGroups)
@@ -140,10 +132,7 @@ CGroupTimer* CGroupTimer::Clone(CGroupTimer* parent) const
 {
     OX_ASSERT(m_Id.empty() && "Timer with non-empty Id is not copyable!");
     CGroupTimer* copy = m_Manager->AttachGroupTimer("", parent ? parent : m_Parent);
-    copy->m_Time = m_Time;
-    copy->m_FrameDelta = m_FrameDelta;
-    copy->m_PauseCount = m_PauseCount;
-    copy->m_K = m_K;
+    copy->CopyClock(*this);
     for (CTimer* timer : m_ChildTimers)
         timer->Clone(copy);
     for (CGroupTimer* group : m_ChildGroups)

@@ -30,7 +30,9 @@ private:
     double m_Base;
 };
 
-class CTimer {
+// What a timer and a group timer share: a clock, a nesting pause count, a whole-number
+// speed and the owning group.
+class CTimerClock {
 public:
     void SetK(float _k);
     float GetK() const { return m_K; }
@@ -39,18 +41,13 @@ public:
     int GetFrameDelta() const { return m_FrameDelta; }
     void Pause(bool flag);
     bool IsPaused() const { return m_PauseCount != 0; }
-    void Destroy();
-
     CGroupTimer* GetParent() const { return m_Parent; }
-    void SetParent(CGroupTimer* parent);
-    CTimer* Clone(CGroupTimer* parent) const;
 
-private:
-    friend class CTimeManager;
-    friend class CGroupTimer;
-    CTimer(CTimeManager* manager, CGroupTimer* parent) : m_Manager(manager), m_Parent(parent) {}
-    ~CTimer() = default;
-    void Update(int step);
+protected:
+    CTimerClock(CTimeManager* manager, CGroupTimer* parent) : m_Manager(manager), m_Parent(parent) {}
+    // Advances by step times the speed unless paused; the delta is kept in 16 bits.
+    void Advance(int step);
+    void CopyClock(const CTimerClock& other);
 
     CTimeManager* m_Manager;
     uint32_t m_Time = 0;
@@ -60,24 +57,29 @@ private:
     CGroupTimer* m_Parent;
 };
 
-class CGroupTimer {
+class CTimer : public CTimerClock {
+public:
+    void Destroy();
+    void SetParent(CGroupTimer* parent);
+    CTimer* Clone(CGroupTimer* parent) const;
+
+private:
+    friend class CTimeManager;
+    friend class CGroupTimer;
+    CTimer(CTimeManager* manager, CGroupTimer* parent) : CTimerClock(manager, parent) {}
+    ~CTimer() = default;
+    void Update(int step) { Advance(step); }
+};
+
+class CGroupTimer : public CTimerClock {
 public:
     const misc::StringA24& GetId() const { return m_Id; }
     CTimer* AttachTimer();
     CGroupTimer* AttachGroupTimer(const char* id);
     // A direct child group with this id (no recursion); null for an empty id.
     CGroupTimer* GetChildGroupTimer(const char* id) const;
-
-    void SetK(float _k);
-    float GetK() const { return m_K; }
-    unsigned GetTime() const { return m_Time; }
-    void SetTime(unsigned time) { m_Time = time; }
-    int GetFrameDelta() const { return m_FrameDelta; }
-    void Pause(bool flag);
-    bool IsPaused() const { return m_PauseCount != 0; }
     void Destroy();
 
-    CGroupTimer* GetParent() const { return m_Parent; }
     void SetParent(CGroupTimer* parent);
     CGroupTimer* Clone(CGroupTimer* parent) const;
 
@@ -91,15 +93,9 @@ private:
     ~CGroupTimer() = default;
     void Update(int step);
 
-    CTimeManager* m_Manager;
     misc::StringA24 m_Id;
     std::set<CGroupTimer*> m_ChildGroups;
     std::set<CTimer*> m_ChildTimers;
-    uint32_t m_Time = 0;
-    int16_t m_FrameDelta = 0;
-    uint8_t m_PauseCount = 0;
-    int8_t m_K = 1;
-    CGroupTimer* m_Parent;
 };
 
 // m_Time of the manager as of its last update, for code that wants a frame-stable clock.

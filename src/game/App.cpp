@@ -45,6 +45,7 @@ CApp::CApp() = default;
 
 CApp::~CApp()
 {
+    m_Demo.reset();
     CloseOutput();
     m_GameFolder.clear();
     m_Lua.reset();
@@ -118,6 +119,7 @@ bool CApp::Init()
     m_Renderer.SetSourceResolution(kSourceWidth, kSourceHeight);
     // The window opens at the source size until the player's options choose the mode.
     ChangeScreenMode(false, true, kSourceWidth, kSourceHeight);
+    m_Demo = std::make_unique<CDemoScene>(m_Renderer);
 
     m_Lua->LoadScript("scripts/main.lua");
     lua::CallLuaFunction(m_Lua.get(), "Init");
@@ -151,7 +153,12 @@ void CApp::ProcessEvent()
     CApplication::ProcessEvent();
 }
 
-void CApp::DoDraw(graphics::CRenderer* renderer) { CApplication::DoDraw(renderer); }
+void CApp::DoDraw(graphics::CRenderer* renderer)
+{
+    CApplication::DoDraw(renderer);
+    if (m_Demo)
+        m_Demo->Draw(*renderer, m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
+}
 
 void CApp::DoUpdate()
 {

@@ -4,6 +4,7 @@
 #include "core/Application.h"
 #include "core/TimeManager.h"
 #include "core/platform/StandaloneApplicationSdl.h"
+#include "game/DemoScene.h"
 #include "lua/Lua.h"
 
 #include <cstdio>
@@ -47,6 +48,8 @@ private:
     // The adapter lives as long as the process, as the platform's own window would.
     std::unique_ptr<ox::core::CStandaloneApplicationSdl> m_Adapter;
     InitFailure m_InitFailure = InitFailure::None;
+    // Drawn until the game's windows exist.
+    std::unique_ptr<CDemoScene> m_Demo;
     bool m_OutputRedirected = false;
 };
 

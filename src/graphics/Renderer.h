@@ -1,10 +1,17 @@
 #pragma once
-// The drawing facade on a fixed canvas (the source resolution). This part holds the window
-// mode and the aspect mapping of the canvas onto the window; the device and the primitives
-// join it with the graphics device.
+// The drawing facade on a fixed canvas (the source resolution): maps the canvas onto the
+// window with an aspect-preserving scale and offset, owns the render state and the render
+// device, turns each primitive into vertices, clips them and hands them to the batch.
+#include "graphics/Color.h"
+#include "graphics/RenderBackend.h"
+#include "graphics/RenderDevice.h"
+#include "graphics/RendererState.h"
+#include "misc/Matrix.h"
+#include "misc/Poly.h"
 #include "misc/Rect.h"
 #include "misc/Vector.h"
 
+#include <memory>
 #include <vector>
 
 namespace ox::core {
@@ -13,24 +20,54 @@ class CSystemIntegration;
 
 namespace ox::graphics {
 
-struct Resolution {
-    unsigned Width = 0;
-    unsigned Height = 0;
-    bool Bpp32 = true;
-    bool operator==(const Resolution& o) const { return Width == o.Width && Height == o.Height && Bpp32 == o.Bpp32; }
+class CSurface;
+class CTexture;
+struct UVRect;
+
+enum Justify : int {
+    JustifyLeft = -1,
+    JustifyCenterH = 0,
+    JustifyRight = 1,
+    JustifyTop = -1,
+    JustifyCenterV = 0,
+    JustifyBottom = 1,
 };
-using ResolutionsT = std::vector<Resolution>;
+
+// Whoever holds device objects that must go before the device does (the texture
+// manager, dynamic surfaces). forReset: only what a reset loses.
+class IDeviceResourceOwner {
+public:
+    virtual ~IDeviceResourceOwner() = default;
+    virtual void ReleaseDeviceResources(bool forReset) = 0;
+};
+
+// The backend the game runs on (OpenGL).
+std::unique_ptr<IRenderBackend> CreateDefaultBackend();
 
 class CRenderer {
 public:
-    CRenderer() = default;
+    CRenderer();
+    explicit CRenderer(std::unique_ptr<IRenderBackend> backend);
+    ~CRenderer();
+    CRenderer(const CRenderer&) = delete;
+    CRenderer& operator=(const CRenderer&) = delete;
 
     // The window the canvas is drawn into (client size read from it when windowed).
     void SetSystemIntegration(core::CSystemIntegration* adapter) { m_Adapter = adapter; }
+    // Replaces the backend; any device of the old one is released first.
+    void SetBackend(std::unique_ptr<IRenderBackend> backend);
+    IRenderBackend* GetBackend() const { return m_Backend.get(); }
+    RenderDevice& GetDevice() { return *m_Device; }
+    CRendererState& GetState() { return m_State; }
 
     bool InitWindow(bool fullscreen, bool bpp32, unsigned width, unsigned height);
     bool InitGraphics();
     void UpdateWindowInfo();
+    // Device objects go: for a reset only what a reset loses, else everything and the device.
+    void ReleaseDevice(bool forReset);
+    void AddDeviceResourceOwner(IDeviceResourceOwner* owner);
+    void RemoveDeviceResourceOwner(IDeviceResourceOwner* owner);
+    bool IsDeviceLost() const { return m_DeviceLost; }
 
     void SetSourceResolution(int width, int height);
     misc::IntVector GetSourceResolution() const { return {m_SourceWidth, m_SourceHeight}; }
@@ -45,28 +82,94 @@ public:
 
     void GetAvailableResolutions(ResolutionsT& out) const { out = m_Resolutions; }
     void SetAvailableResolutions(ResolutionsT resolutions) { m_Resolutions = std::move(resolutions); }
-    // Fills the list from the display modes SDL reports.
+    // Fills the list from the display modes the device reports.
     void EnumResolutions();
 
     void RequestModeRestore(bool bpp32);
     // Before a frame: a pending restore of a windowed mode asks the application for it.
     void CheckModeRestore();
 
-    // The frame. Without a render device there is nothing to draw into: false.
-    bool BeginScene() { return false; }
-    bool EndScene() { return true; }
-    void ReleaseDevice(bool /*forReset*/) {}
+    // The frame.
+    bool BeginScene();
+    bool EndScene();
+    void Flush() { m_Device->Flush(); }
+    void Clear(const Color& color) { m_Device->Clear(color); }
+
+    // State.
+    void SetColor(const Color& color) { m_State.SetColor(color); }
+    const Color& GetColor() const { return m_State.GetColor(); }
+    void SetBlendMode(BlendModes mode) { m_State.SetBlendMode(mode); }
+    BlendModes GetBlendMode() const { return m_State.GetBlendMode(); }
+    void ApplyMatrix(const misc::FloatMatrix& m) { m_State.ApplyMatrix(m); }
+    const misc::FloatMatrix& GetMatrix() const { return m_State.GetMatrix(); }
+    void SetClipPoly(const misc::Poly4& poly) { m_State.SetClipPoly(poly); }
+    void PushState() { m_State.PushState(); }
+    void PopState() { m_State.PopState(); }
+    void PushMatrix() { m_State.PushMatrix(); }
+    void PopMatrix() { m_State.PopMatrix(); }
+    void PushBlendMode() { m_State.PushBlendMode(); }
+    void PopBlendMode() { m_State.PopBlendMode(); }
+    void PushColor() { m_State.PushColor(); }
+    void PopColor() { m_State.PopColor(); }
+    void SetPixelShader(const CPixelShader* shader) { m_State.SetPixelShader(shader); }
+    // A render-target surface, or null for the back buffer.
+    void SetRenderTarget(const CSurface* surface);
+
+    // Primitives, in source coordinates. The colour multiplies the current colour.
+    void RenderLine(const misc::FloatVector& from, const misc::FloatVector& to, const Color& color = Color());
+    void RenderRect(const misc::FloatRect& rect, const Color& color = Color());
+    void RenderFilledPoly4(const misc::Poly4& poly, const Color& color = Color());
+    void RenderTexture(const CTexture* texture, float x, float y, unsigned frame = 0, const Color& color = Color());
+    void RenderTexture(const CTexture* texture, const misc::FloatRect& dest, unsigned frame = 0,
+                       const Color& color = Color());
+    void RenderTexture(const CTexture* texture, const misc::Poly4& dest, unsigned frame = 0,
+                       const Color& color = Color());
+    void RenderTexture(const CTexture* texture, float x, float y, const misc::ShortRect& source,
+                       const Color& color = Color());
+    void RenderTexture(const CTexture* texture, const misc::FloatRect& dest, const misc::ShortRect& source,
+                       const Color& color = Color());
+    void RenderTexture(const CTexture* texture, const misc::Poly4& dest, const misc::ShortRect& source,
+                       const Color& color = Color());
+    // One triangle with its own texture coordinates.
+    void RenderTextureTriangle(const CTexture* texture, const misc::FloatVector& p0, const misc::FloatVector& p1,
+                               const misc::FloatVector& p2, const misc::FloatVector& uv0,
+                               const misc::FloatVector& uv1, const misc::FloatVector& uv2,
+                               const Color& color = Color());
+    // A nine-part box: corners unscaled, edges and middle repeated.
+    void RenderTextureBox(const CTexture* texture, const misc::FloatRect& dest, unsigned frame = 0,
+                          const Color& color = Color());
+    void RenderTextureBox(const CTexture* texture, const misc::FloatRect& dest, const misc::ShortRect& source,
+                          const Color& color = Color());
+
+    // A copy of an area of the back buffer (source coordinates; empty: the whole window),
+    // as top-down 0xAARRGGBB words.
+    bool ReadBackBuffer(std::vector<uint32_t>& pixels, unsigned& width, unsigned& height,
+                        const misc::IntRect& area);
 
 private:
     void CalculateAspect();
+    bool TestDevice();
+    // The vertex colour for a draw, or false when nothing is to be drawn.
+    bool Preamble(const Color& color, uint32_t& diffuse) const;
+    void DrawVertices(PrimitiveType type, CDeviceTexture* texture, Vertex* vertices, unsigned count);
+    // Transformed and clipped vertices to the device with the current state.
+    void Submit(PrimitiveType type, CDeviceTexture* texture, const Vertex* vertices, unsigned count);
+    void DrawRectQuad(CDeviceTexture* texture, const misc::FloatRect& dest, const UVRect& uv, uint32_t diffuse);
+    void DrawPolyQuad(CDeviceTexture* texture, const misc::Poly4& dest, const UVRect& uv, uint32_t diffuse);
+    void DrawBox(const CTexture* texture, const misc::FloatRect& dest, const UVRect& uv, uint32_t diffuse);
 
     core::CSystemIntegration* m_Adapter = nullptr;
+    std::unique_ptr<IRenderBackend> m_Backend;
+    std::vector<IDeviceResourceOwner*> m_Owners;
+
     bool m_KeepAspect = true;
     bool m_IsFullscreen = false;
     unsigned m_Width = 0;
     unsigned m_Height = 0;
     bool m_Bpp32 = true;
     ResolutionsT m_Resolutions;
+    CRendererState m_State;
+    std::unique_ptr<RenderDevice> m_Device;
     bool m_DeviceLost = false;
     int m_SourceWidth = 0;
     int m_SourceHeight = 0;

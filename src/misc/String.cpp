@@ -114,14 +114,10 @@ void BasicString::Assign(const BasicString& other, size_t from, size_t count, si
     Assign(static_cast<const char*>(other.Data()) + from * _char_size, count, _char_size);
 }
 
-void BasicString::Append(const void* text, size_t _char_size)
+// Appends `len` characters, cut to the capacity once the caller's contract check has fired.
+void BasicString::AppendChars(const void* text, size_t len, size_t _char_size)
 {
-    OX_ASSERT(max_size != 0);
-    OX_CHECK_CHAR_SIZE();
-    size_t len = TextLength(text, _char_size);
-    size_t sz = size + len;
-    OX_ASSERT(sz + 1 <= max_size);
-    if (sz + 1 > max_size)
+    if (size + len >= max_size)
         len = max_size - 1 - size;
     memmove(static_cast<char*>(Data()) + size * _char_size, text, len * _char_size);
     size = static_cast<uint16_t>(size + len);
@@ -129,18 +125,22 @@ void BasicString::Append(const void* text, size_t _char_size)
     hash = 0;
 }
 
+void BasicString::Append(const void* text, size_t _char_size)
+{
+    OX_ASSERT(max_size != 0);
+    OX_CHECK_CHAR_SIZE();
+    size_t len = TextLength(text, _char_size);
+    size_t sz = size + len;
+    OX_ASSERT(sz + 1 <= max_size);
+    AppendChars(text, len, _char_size);
+}
+
 void BasicString::Append(const BasicString& other, size_t _char_size)
 {
     OX_ASSERT(max_size != 0);
     OX_CHECK_CHAR_SIZE();
-    size_t len = other.size;
     OX_ASSERT(size + other.size < max_size);
-    if (size + len >= max_size)
-        len = max_size - 1 - size;
-    memmove(static_cast<char*>(Data()) + size * _char_size, other.Data(), len * _char_size);
-    size = static_cast<uint16_t>(size + len);
-    SetChar(Data(), size, 0, _char_size);
-    hash = 0;
+    AppendChars(other.Data(), other.size, _char_size);
 }
 
 void BasicString::Resize(size_t _new_size, uint32_t fill, size_t _char_size)

@@ -43,6 +43,7 @@ struct BasicString {
 
 protected:
     void Init(uint16_t capacity);
+    void AppendChars(const void* text, size_t len, size_t _char_size);
 };
 static_assert(sizeof(BasicString) == 8);
 

@@ -1,5 +1,6 @@
 #include "core/Application.h"
 #include "core/TimeManager.h"
+#include "support/RecordingBackend.h"
 #include "support/TestSupport.h"
 
 using namespace ox::core;
@@ -177,4 +178,37 @@ TEST_F(AppFixture, SecondInstanceInitFailsQuietly)
     oxtest::MessageCapture boxes;
     EXPECT_FALSE(app->Init());
     EXPECT_TRUE(boxes.Boxes().empty());
+}
+
+TEST_F(AppFixture, DrawBracketsTheFrameAndCoversTheBars)
+{
+    auto owned = std::make_unique<oxtest::RecordingBackend>();
+    oxtest::RecordingBackend* backend = owned.get();
+    app->GetRenderer()->SetBackend(std::move(owned));
+    app->GetRenderer()->InitWindow(true, true, 1920, 1080);
+    backend->ClearRecord();
+    app->Draw();
+    ASSERT_EQ(backend->calls.front(), "BeginScene");
+    ASSERT_EQ(backend->draws.size(), 1u);
+    const auto& v = backend->draws[0].vertices;
+    ASSERT_EQ(v.size(), 12u);
+    // Pillar bars of 240 window pixels on both sides, opaque black.
+    EXPECT_FLOAT_EQ(v[0].x, -0.5f);
+    EXPECT_FLOAT_EQ(v[1].x, 239.5f);
+    EXPECT_FLOAT_EQ(v[2].y, 1079.5f);
+    EXPECT_FLOAT_EQ(v[6].x, 1679.5f);
+    EXPECT_FLOAT_EQ(v[7].x, 1919.5f);
+    EXPECT_EQ(v[0].diffuse, 0xFF000000u);
+    EXPECT_EQ(backend->calls.back(), "ReleaseEventQuery");
+    EXPECT_EQ(backend->Calls("Present").size(), 1u);
+
+    // A canvas that fills the window has no bars; a minimised application draws nothing.
+    app->GetRenderer()->InitWindow(true, true, 1024, 768);
+    backend->ClearRecord();
+    app->Draw();
+    EXPECT_TRUE(backend->draws.empty());
+    Send(WM_SIZE, SIZE_MINIMIZED);
+    backend->ClearRecord();
+    app->Draw();
+    EXPECT_TRUE(backend->calls.empty());
 }

@@ -47,6 +47,7 @@ public:
     void ClipCursor(const IntRect* clientRect) override;
 
     SDL_Window* GetWindow() const { return m_Wnd; }
+    void* GetWindowHandle() override { return m_Wnd; }
     bool IsStopRequested() const { return m_StopRequested; }
     // The last CheckSingleInstance found another instance running.
     bool IsSecondInstance() const { return m_SecondInstance; }

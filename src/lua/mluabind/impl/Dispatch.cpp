@@ -84,6 +84,20 @@ void ReportNull(CHost& host, const char* where, const GenericClass* cls)
     host.Report("%s: error - the object of %s is null or was collected.\n", where, cls->FullName.c_str());
 }
 
+// Keeps the candidates of the lowest score: a better one restarts the list, an equal one
+// joins it while there is room.
+template <class T>
+void KeepBest(T* candidate, int score, T** candidates, int limit, int& found, int& best)
+{
+    if (score < best) {
+        best = score;
+        found = 0;
+        candidates[found++] = candidate;
+    } else if (score == best && found < limit - 1) {
+        candidates[found++] = candidate;
+    }
+}
+
 int MatchMethod(CHost& host, lua_State* L, GenericMethod* method, const LuaCustomVariable& view,
                 const LuaCustomVariable* self)
 {
@@ -131,14 +145,7 @@ int MethodCallDispatcher(CHost& host, lua_State* L, LuaCustomVariable& view, Lua
     }
     for (size_t k = 0; k < count; ++k) {
         GenericMethod* method = run[k].second;
-        int score = MatchMethod(host, L, method, view, self);
-        if (score < best) {
-            best = score;
-            found = 0;
-            candidates[found++] = method;
-        } else if (score == best && found < MaxMethodCandidates - 1) {
-            candidates[found++] = method;
-        }
+        KeepBest(method, MatchMethod(host, L, method, view, self), candidates, MaxMethodCandidates, found, best);
     }
     if (best != NoMatch && found == 1)
         return InvokeMethod(host, L, candidates[0], view, self);
@@ -374,14 +381,7 @@ int ConstructorBody(CHost& host, lua_State* L)
     int found = 0;
     int best = NoMatch;
     for (ConstructorDescription* constructor : cls->m_Constructors) {
-        int score = constructor->MatchFunction(host, L, 1, 0, true);
-        if (score < best) {
-            best = score;
-            found = 0;
-            candidates[found++] = constructor;
-        } else if (score == best && found < MaxMethodCandidates - 1) {
-            candidates[found++] = constructor;
-        }
+        KeepBest(constructor, constructor->MatchFunction(host, L, 1, 0, true), candidates, MaxMethodCandidates, found, best);
     }
     if (best != NoMatch && found == 1) {
         if (host.GetFrame()->Raise)
@@ -419,14 +419,7 @@ int FunctionBody(CHost& host, lua_State* L)
     int found = 0;
     int best = NoMatch;
     for (GenericFunction* function : *overloads) {
-        int score = function->MatchFunction(host, L, 1, 0, true);
-        if (score < best) {
-            best = score;
-            found = 0;
-            candidates[found++] = function;
-        } else if (score == best && found < MaxFunctionCandidates - 1) {
-            candidates[found++] = function;
-        }
+        KeepBest(function, function->MatchFunction(host, L, 1, 0, true), candidates, MaxFunctionCandidates, found, best);
     }
     if (best != NoMatch && found == 1) {
         if (host.GetFrame()->Raise)

@@ -1,0 +1,267 @@
+#include "core/TexturesAlpha.h"
+
+#include "diag/Assert.h"
+#include "diag/Log.h"
+#include "misc/GamePack.h"
+
+#include <algorithm>
+#include <cstring>
+
+namespace ox::core {
+
+namespace {
+
+constexpr const char* kChannel = "textures_alpha";
+constexpr uint32_t kRevision = 1;
+
+uint16_t ReadU16(const uint8_t* p)
+{
+    uint16_t value;
+    memcpy(&value, p, sizeof(value));
+    return value;
+}
+
+} // namespace
+
+CTexturesAlpha::CTexturesAlpha(misc::CGamePack* pack) : m_Pack(pack) {}
+
+CTexturesAlpha::~CTexturesAlpha() { Release(); }
+
+void CTexturesAlpha::Release()
+{
+    if (m_File)
+        (m_Pack ? *m_Pack : misc::g_GamePack::Instance()).Close(m_File);
+    m_File = nullptr;
+    m_Header = nullptr;
+    m_Records = nullptr;
+    m_Size = 0;
+}
+
+bool CTexturesAlpha::Load()
+{
+    Release();
+    misc::CGamePack& pack = m_Pack ? *m_Pack : misc::g_GamePack::Instance();
+    unsigned size = 0;
+    const void* data = pack.Open(kTexturesAlphaFile, &size);
+    if (!data)
+        return false;
+    if (!LoadFromMemory(data, size, kTexturesAlphaFile)) {
+        pack.Close(data);
+        return false;
+    }
+    m_File = data;
+    return true;
+}
+
+bool CTexturesAlpha::LoadFromMemory(const void* data, size_t size, const char* name)
+{
+    Release();
+    const auto* bytes = static_cast<const uint8_t*>(data);
+    if (!bytes || !Check(bytes, size, name))
+        return false;
+    m_Header = reinterpret_cast<const TexturesAlphaHeader*>(bytes);
+    m_Records = reinterpret_cast<const TextureAlphaDesc*>(bytes + sizeof(TexturesAlphaHeader));
+    m_Size = size;
+    return true;
+}
+
+bool CTexturesAlpha::Check(const uint8_t* data, size_t size, const char* name) const
+{
+    if (reinterpret_cast<uintptr_t>(data) % alignof(TextureAlphaDesc) != 0) {
+        OX_LOG(kChannel, diag::LogError, "\"%s\" is not aligned in memory", name);
+        return false;
+    }
+    if (size < sizeof(TexturesAlphaHeader)) {
+        OX_LOG(kChannel, diag::LogError, "\"%s\" is too short for its header (%zu bytes)", name, size);
+        return false;
+    }
+    const auto* head = reinterpret_cast<const TexturesAlphaHeader*>(data);
+    if (head->magick != g_Magick) {
+        OX_ASSERT_A(head->magick == g_Magick);
+        OX_LOG(kChannel, diag::LogError,
+               "Textures alpha bindump is corrupted or has another version. Current revision: %u, bindump's "
+               "revision%u",
+               kRevision, head->magick >> 24);
+        return false;
+    }
+    if (sizeof(TexturesAlphaHeader) + uint64_t(head->count) * sizeof(TextureAlphaDesc) > size) {
+        OX_LOG(kChannel, diag::LogError, "\"%s\": %u records do not fit in its %zu bytes", name, head->count, size);
+        return false;
+    }
+    const auto* records = reinterpret_cast<const TextureAlphaDesc*>(data + sizeof(TexturesAlphaHeader));
+    for (uint32_t i = 0; i < head->count; ++i) {
+        const TextureAlphaDesc& record = records[i];
+        const misc::StringA88& id = record.id;
+        // Ids are compared in place: each must be a well-formed string with its hash set.
+        if (id.max_size != misc::StringA88::kCapacity || id.size >= misc::StringA88::kCapacity ||
+            id.m_Data[id.size] != 0 || id.hash != misc::CalcHash(id.m_Data, id.size)) {
+            OX_LOG(kChannel, diag::LogError, "\"%s\": record %u has a corrupt id", name, i);
+            return false;
+        }
+        if (i > 0 && records[i - 1].id.Compare(id.c_str()) >= 0) {
+            OX_LOG(kChannel, diag::LogError, "\"%s\": record %u (\"%s\") is out of order", name, i, id.c_str());
+            return false;
+        }
+        if (!record.uniform && uint64_t(record.offset) + record.size > size) {
+            OX_LOG(kChannel, diag::LogError, "\"%s\": the runs of \"%s\" lie outside the file", name, id.c_str());
+            return false;
+        }
+    }
+    return true;
+}
+
+const TextureAlphaDesc* CTexturesAlpha::Find(const char* id) const
+{
+    if (!m_Header || !id || strlen(id) >= misc::StringA88::kCapacity)
+        return nullptr;
+    size_t lo = 0, hi = m_Header->count;
+    while (lo < hi) {
+        size_t mid = lo + (hi - lo) / 2;
+        int order = m_Records[mid].id.Compare(id);
+        if (order == 0)
+            return &m_Records[mid];
+        if (order < 0)
+            lo = mid + 1;
+        else
+            hi = mid;
+    }
+    return nullptr;
+}
+
+bool CTexturesAlpha::IsOpaque(const char* _from, int x, int y) const
+{
+    OX_ASSERT(_from != 0);
+    OX_ASSERT(IsAvailable());
+    if (!_from || !IsAvailable())
+        return false;
+    const TextureAlphaDesc* desc = Find(_from);
+    OX_ASSERT(desc);
+    if (!desc)
+        return false;
+    if (desc->uniform)
+        return desc->uniform_value != 0;
+    if (x < 0 || y < 0 || x >= desc->width || y >= desc->height)
+        return false;
+
+    const uint64_t index = desc->order == 1 ? uint64_t(desc->width) * y + x : uint64_t(desc->height) * x + y;
+    const uint8_t* runs = reinterpret_cast<const uint8_t*>(m_Header) + desc->offset;
+    const size_t count = desc->size / 2;
+    uint64_t sum = 0;
+    for (size_t i = 0; i < count; ++i) {
+        uint16_t run = ReadU16(runs + i * 2);
+        sum += run & kMaxRunLength;
+        if (index < sum)
+            return (run & kRunValueBit) != 0;
+    }
+    return false;
+}
+
+namespace {
+
+// The runs of one image, by rows or by columns; none when every pixel gives one answer.
+std::vector<uint16_t> MakeRuns(const AlphaMaskSource& source, bool byRows, bool* uniform, bool* value)
+{
+    std::vector<uint16_t> runs;
+    const uint64_t total = uint64_t(source.width) * source.height;
+    auto solid = [&](uint64_t i) {
+        uint64_t x = byRows ? i % source.width : i / source.height;
+        uint64_t y = byRows ? i / source.width : i % source.height;
+        return (source.pixels[y * source.width + x] >> 24) != 0;
+    };
+    *uniform = true;
+    *value = total ? solid(0) : false;
+    uint64_t i = 0;
+    while (i < total) {
+        bool current = solid(i);
+        if (current != *value)
+            *uniform = false;
+        uint64_t length = 1;
+        while (i + length < total && length < kMaxRunLength && solid(i + length) == current)
+            ++length;
+        runs.push_back(uint16_t(length | (current ? kRunValueBit : 0)));
+        i += length;
+    }
+    if (*uniform)
+        runs.clear();
+    return runs;
+}
+
+bool Fail(std::string* error, const std::string& text)
+{
+    if (error)
+        *error = text;
+    return false;
+}
+
+} // namespace
+
+bool BuildTexturesAlpha(const std::vector<AlphaMaskSource>& sources, std::vector<uint8_t>& out, std::string* error)
+{
+    out.clear();
+    std::vector<const AlphaMaskSource*> sorted;
+    for (const AlphaMaskSource& source : sources) {
+        if (source.id.empty() || source.id.size() >= misc::StringA88::kCapacity ||
+            source.id.find('\0') != std::string::npos)
+            return Fail(error, "the id \"" + source.id + "\" is empty or longer than 87 bytes");
+        if (source.width > 0xFFFF || source.height > 0xFFFF)
+            return Fail(error, "\"" + source.id + "\" is too big for a mask (at most 65535 a side)");
+        if (source.pixels.size() != size_t(source.width) * source.height)
+            return Fail(error, "\"" + source.id + "\" has the wrong number of pixels");
+        sorted.push_back(&source);
+    }
+    // The order of Compare: unsigned bytes, as strcmp has it.
+    std::sort(sorted.begin(), sorted.end(),
+              [](const AlphaMaskSource* a, const AlphaMaskSource* b) { return strcmp(a->id.c_str(), b->id.c_str()) < 0; });
+    for (size_t i = 1; i < sorted.size(); ++i)
+        if (sorted[i - 1]->id == sorted[i]->id)
+            return Fail(error, "the id \"" + sorted[i]->id + "\" is given twice");
+
+    const size_t recordsEnd = sizeof(TexturesAlphaHeader) + sorted.size() * sizeof(TextureAlphaDesc);
+    out.resize(recordsEnd);
+    TexturesAlphaHeader header{g_Magick, uint32_t(sorted.size())};
+    memcpy(out.data(), &header, sizeof(header));
+    for (size_t i = 0; i < sorted.size(); ++i) {
+        const AlphaMaskSource& source = *sorted[i];
+        bool uniform = false, value = false;
+        std::vector<uint16_t> runs;
+        bool byRows = source.order != 2;
+        runs = MakeRuns(source, byRows, &uniform, &value);
+        if (source.order == 0 && !uniform) {
+            bool ignoredUniform, ignoredValue;
+            std::vector<uint16_t> columns = MakeRuns(source, false, &ignoredUniform, &ignoredValue);
+            if (columns.size() < runs.size()) {
+                runs = std::move(columns);
+                byRows = false;
+            }
+        }
+        const size_t runBytes = runs.size() * sizeof(uint16_t);
+        if (out.size() + runBytes > 0xFFFFFFFFu)
+            return Fail(error, "the masks do not fit in 4 GB");
+
+        // The record is written byte by byte: an id string with its hash and zero padding.
+        uint8_t record[sizeof(TextureAlphaDesc)] = {};
+        misc::StringA88 id(source.id);
+        id.Hash();
+        memcpy(record, &id, sizeof(misc::BasicString));
+        memcpy(record + sizeof(misc::BasicString), id.c_str(), id.size);
+        const uint16_t width = uint16_t(source.width), height = uint16_t(source.height);
+        const uint32_t offset = uniform ? 0 : uint32_t(out.size());
+        const uint32_t size = uint32_t(runBytes);
+        memcpy(record + kDescWidth, &width, 2);
+        memcpy(record + kDescHeight, &height, 2);
+        memcpy(record + kDescOffset, &offset, 4);
+        memcpy(record + kDescSize, &size, 4);
+        record[kDescUniform] = uniform ? 1 : 0;
+        record[kDescUniformValue] = value ? 1 : 0;
+        record[kDescOrder] = byRows ? 1 : 0;
+        memcpy(out.data() + sizeof(TexturesAlphaHeader) + i * sizeof(TextureAlphaDesc), record, sizeof(record));
+
+        const size_t at = out.size();
+        out.resize(at + runBytes);
+        if (runBytes)
+            memcpy(out.data() + at, runs.data(), runBytes);
+    }
+    return true;
+}
+
+} // namespace ox::core

@@ -1,0 +1,108 @@
+#include "game/DemoScene.h"
+
+#include <cmath>
+
+namespace k17 {
+
+using namespace ox;
+using graphics::Color;
+using misc::FloatRect;
+using misc::FloatVector;
+
+namespace {
+
+constexpr int kTextureSize = 48;
+
+// A framed tile: a bright border of 4 pixels, a checker inside, a soft alpha toward the
+// corners, so that both the nine-part box and blending show.
+std::vector<uint32_t> MakeTile()
+{
+    std::vector<uint32_t> pixels(kTextureSize * kTextureSize);
+    for (int y = 0; y < kTextureSize; ++y)
+        for (int x = 0; x < kTextureSize; ++x) {
+            const bool border = x < 4 || y < 4 || x >= kTextureSize - 4 || y >= kTextureSize - 4;
+            const bool checker = ((x / 8) + (y / 8)) % 2 == 0;
+            uint32_t rgb = border ? 0xF0C040u : (checker ? 0x4080E0u : 0x203870u);
+            const float dx = x - (kTextureSize - 1) / 2.0f, dy = y - (kTextureSize - 1) / 2.0f;
+            const float d = std::sqrt(dx * dx + dy * dy) / (kTextureSize / 2.0f);
+            const uint32_t alpha = d > 1.2f ? 0x60u : 0xFFu;
+            pixels[y * kTextureSize + x] = alpha << 24 | rgb;
+        }
+    return pixels;
+}
+
+} // namespace
+
+CDemoScene::CDemoScene(graphics::CRenderer& renderer) : m_Renderer(renderer), m_Pixels(MakeTile())
+{
+    m_Surface = std::make_unique<graphics::CSurface>(kTextureSize, kTextureSize);
+    m_Texture = std::make_unique<graphics::CTexture>(m_Surface.get());
+    m_Renderer.AddDeviceResourceOwner(this);
+}
+
+CDemoScene::~CDemoScene()
+{
+    m_Renderer.RemoveDeviceResourceOwner(this);
+    m_Texture.reset();
+    m_Surface.reset();
+}
+
+void CDemoScene::ReleaseDeviceResources(bool forReset)
+{
+    if (!forReset)
+        m_Surface->ReleaseD3D();
+}
+
+void CDemoScene::Draw(graphics::CRenderer& r, unsigned timeMs)
+{
+    if (!m_Surface->IsValid())
+        m_Surface->LoadBits(m_Pixels.data(), m_Pixels.size() * 4, kTextureSize, kTextureSize,
+                            graphics::FormatA8R8G8B8);
+    const float t = timeMs / 1000.0f;
+    r.Clear(Color(0xFF1C2430u));
+
+    // A floor of filled quads and a frame of lines.
+    for (int i = 0; i < 8; ++i) {
+        const float shade = 0.5f + 0.5f * std::sin(t + i * 0.6f);
+        const auto g = static_cast<int16_t>(60 + 80 * shade);
+        r.RenderFilledPoly4(misc::RectToPoly4({40.0f + i * 120, 600, 100, 120}), Color(70, g, 110, 255));
+    }
+    r.RenderRect({20, 20, 984, 728}, Color(0xFFF0C040u));
+    for (int i = 0; i < 12; ++i) {
+        const float a = t * 0.5f + i * 3.14159265f / 6;
+        r.RenderLine({512, 300}, {512 + 220 * std::cos(a), 300 + 220 * std::sin(a)}, Color(0xC0FFFFFFu));
+    }
+
+    // The tile at natural size, stretched, as a nine-part box and spinning about its centre.
+    r.RenderTexture(m_Texture.get(), 60.0f, 60.0f);
+    r.RenderTexture(m_Texture.get(), FloatRect(60, 140, 160, 90));
+    r.RenderTextureBox(m_Texture.get(), FloatRect(60, 260, 200, 150));
+    r.PushMatrix();
+    r.ApplyMatrix(misc::MatrixTranslation(-80, -80) * misc::MatrixRotation(t) * misc::MatrixTranslation(830, 200));
+    r.RenderTexture(m_Texture.get(), FloatRect(0, 0, 160, 160));
+    r.PopMatrix();
+
+    // Additive glows that pulse.
+    r.PushBlendMode();
+    r.SetBlendMode(graphics::BlendAdditive);
+    const auto glow = static_cast<int16_t>(100 + 100 * (0.5f + 0.5f * std::sin(t * 2)));
+    r.RenderTexture(m_Texture.get(), FloatRect(700, 420, 120, 120), 0, Color(255, 120, 40, glow));
+    r.RenderTexture(m_Texture.get(), FloatRect(760, 460, 120, 120), 0, Color(40, 120, 255, glow));
+    r.PopBlendMode();
+
+    // A sprite sheet moving under a rotated clip.
+    r.PushState();
+    r.PushMatrix();
+    r.ApplyMatrix(misc::MatrixTranslation(-90, -90) * misc::MatrixRotation(0.4f) * misc::MatrixTranslation(420, 470));
+    r.SetClipPoly(misc::RectToPoly4({0, 0, 180, 180}));
+    r.PopMatrix();
+    for (int i = 0; i < 6; ++i) {
+        const float x = 300 + std::fmod(t * 60 + i * 50, 300.0f);
+        r.RenderTexture(m_Texture.get(), FloatRect(x, 380 + i * 30, 48, 48));
+    }
+    r.PopState();
+    r.RenderTextureTriangle(m_Texture.get(), {600, 80}, {680, 200}, {540, 200}, {0.5f, 0}, {1, 1}, {0, 1},
+                            Color(0xFFFFFFFFu));
+}
+
+} // namespace k17

@@ -1,0 +1,27 @@
+#pragma once
+// What the game draws until widgets and scenes exist: a cleared canvas and a few
+// primitives of every kind the renderer offers, moving with the main timer.
+#include "graphics/Renderer.h"
+#include "graphics/Texture.h"
+
+#include <memory>
+#include <vector>
+
+namespace k17 {
+
+class CDemoScene : public ox::graphics::IDeviceResourceOwner {
+public:
+    explicit CDemoScene(ox::graphics::CRenderer& renderer);
+    ~CDemoScene() override;
+
+    void Draw(ox::graphics::CRenderer& renderer, unsigned timeMs);
+    void ReleaseDeviceResources(bool forReset) override;
+
+private:
+    ox::graphics::CRenderer& m_Renderer;
+    std::vector<uint32_t> m_Pixels;
+    std::unique_ptr<ox::graphics::CSurface> m_Surface;
+    std::unique_ptr<ox::graphics::CTexture> m_Texture;
+};
+
+} // namespace k17

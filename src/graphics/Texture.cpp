@@ -1,0 +1,298 @@
+#include "graphics/Texture.h"
+
+#include "diag/Assert.h"
+#include "diag/Log.h"
+#include "graphics/RenderDevice.h"
+
+#include <cstring>
+
+namespace ox::graphics {
+
+namespace {
+
+CSurface::Loader g_Loader = nullptr;
+
+TextureDesc* NewDesc(uint16_t parts)
+{
+    void* memory = ::operator new(sizeof(TextureDesc) + parts * sizeof(UVRect));
+    auto* desc = new (memory) TextureDesc();
+    std::memset(desc->frame_delays, 0xFF, sizeof desc->frame_delays);
+    std::memset(desc->frame_map, 0xFF, sizeof desc->frame_map);
+    desc->parts_amount = parts;
+    return desc;
+}
+
+void DeleteDesc(TextureDesc* desc)
+{
+    desc->~TextureDesc();
+    ::operator delete(desc);
+}
+
+TextureDesc* CopyDesc(const TextureDesc* from)
+{
+    TextureDesc* desc = NewDesc(from->parts_amount);
+    std::memcpy(static_cast<void*>(desc), from, from->ByteSize());
+    return desc;
+}
+
+} // namespace
+
+// Surface ----------------------------------------------------------------------------
+
+CSurface::CSurface(uint16_t width, uint16_t height, uint8_t flags, uint8_t internalFormat, const char* fileName)
+    : Width(width), Height(height), m_Flags(flags), m_InternalFormat(internalFormat), m_FileName(fileName)
+{
+}
+
+CSurface::~CSurface() { ReleaseD3D(); }
+
+void CSurface::SetLoader(Loader loader) { g_Loader = loader; }
+
+const char* CSurface::GetFileName() const
+{
+    OX_ASSERT(m_FileName != 0);
+    return m_FileName ? m_FileName : "";
+}
+
+void CSurface::Release()
+{
+    OX_ASSERT(RefCount > 0);
+    if (RefCount > 0)
+        --RefCount;
+}
+
+CDeviceTexture* CSurface::GetD3DTexture()
+{
+    OX_ASSERT((!Surface && !m_BytesInVMem) || (Surface && m_BytesInVMem));
+    if (!Surface) {
+        if (g_Loader)
+            g_Loader(*this);
+        else
+            CreateDeviceTexture();
+        m_Flags &= static_cast<uint8_t>(~FlagUnloaded);
+    }
+    return Surface;
+}
+
+bool CSurface::CreateDeviceTexture()
+{
+    if (Surface)
+        return true;
+    IRenderBackend* backend = GetRenderBackend();
+    if (!backend || !backend->HasDevice() || Width == 0 || Height == 0)
+        return false;
+    if (!IsDeviceFormat(m_InternalFormat)) {
+        OX_LOG("graphics", diag::LogError, "unknown format for windows texture: %d", m_InternalFormat);
+        return false;
+    }
+    Surface = backend->CreateTexture(Width, Height, m_InternalFormat, (m_Flags & FlagRenderTarget) != 0);
+    if (!Surface) {
+        CheckResult(ResultOutOfVideoMemory, "Create texture", diag::LogError);
+        return false;
+    }
+    m_BytesInVMem = FormatBitsPerPixel(m_InternalFormat) * Width * Height / 8;
+    return true;
+}
+
+void CSurface::ReleaseD3D()
+{
+    if (Surface) {
+        if (RenderDevice* device = GetRenderDevice())
+            device->ForgetTexture(Surface);
+        if (IRenderBackend* backend = GetRenderBackend())
+            backend->ReleaseTexture(Surface);
+        Surface = nullptr;
+        m_BytesInVMem = 0;
+        m_Buffer.reset();
+    }
+}
+
+void CSurface::Unload()
+{
+    OX_ASSERT(m_Flags & FlagLoadOnDemand);
+    ReleaseD3D();
+    m_Flags |= FlagUnloaded;
+}
+
+void CSurface::CreateBuffer()
+{
+    OX_ASSERT(m_Buffer == 0);
+    OX_ASSERT(Width > 0);
+    OX_ASSERT(Height > 0);
+    if (m_Buffer || Width == 0 || Height == 0)
+        return;
+    GetD3DTexture();
+    m_Buffer.reset(new uint32_t[static_cast<size_t>(Width) * Height]());
+}
+
+void CSurface::LoadBuffer()
+{
+    if (!Surface || !m_Buffer)
+        return;
+    if (IRenderBackend* backend = GetRenderBackend())
+        CheckResult(backend->ReadTexture(Surface, m_Buffer.get()), "LockRect", diag::LogError);
+}
+
+void CSurface::CommitBits()
+{
+    OX_ASSERT(Surface != 0);
+    OX_ASSERT(m_Buffer != 0);
+    if (!Surface || !m_Buffer)
+        return;
+    LoadBits(m_Buffer.get(), static_cast<size_t>(Width) * Height * 4, Width, Height, FormatA8R8G8B8);
+}
+
+bool CSurface::LoadBits(const void* _data, size_t _data_size, unsigned _width, unsigned _height,
+                        uint8_t _internal_format)
+{
+    OX_ASSERT(_data != 0);
+    OX_ASSERT(_data_size != 0);
+    OX_ASSERT(_width != 0);
+    OX_ASSERT(_height != 0);
+    OX_ASSERT(_internal_format != 0);
+    OX_ASSERT(m_InternalFormat == _internal_format);
+    if (!_data || !_data_size || _width != Width || _height != Height || m_InternalFormat != _internal_format)
+        return false;
+    // The data must hold the whole level: rows of pixels, or rows of 4 x 4 blocks.
+    const bool blocks = m_InternalFormat == FormatDXT1 || m_InternalFormat == FormatDXT3 ||
+                        m_InternalFormat == FormatDXT5;
+    const size_t needed = blocks ? static_cast<size_t>((Width + 3) / 4) * ((Height + 3) / 4) *
+                                       (m_InternalFormat == FormatDXT1 ? 8 : 16)
+                                 : static_cast<size_t>(FormatBitsPerPixel(m_InternalFormat)) * Width * Height / 8;
+    if (_data_size < needed) {
+        OX_LOG("graphics", diag::LogError, "LoadBits: %zu bytes for a %ux%u surface of format %d", _data_size,
+               _width, _height, m_InternalFormat);
+        return false;
+    }
+    if (!Surface && !CreateDeviceTexture())
+        return false;
+    IRenderBackend* backend = GetRenderBackend();
+    if (!backend)
+        return false;
+    return !CheckResult(backend->LoadBits(Surface, _data, needed), "LockRect", diag::LogError);
+}
+
+// Texture ----------------------------------------------------------------------------
+
+CTexture::CTexture(CSurface* surface)
+{
+    TextureDesc* desc = NewDesc(1);
+    desc->Parts()[0] = {0, 0, 1, 1};
+    if (surface) {
+        desc->frame_width = surface->GetWidth();
+        desc->frame_height = surface->GetHeight();
+    }
+    desc->frame_delays[0] = 0;
+    desc->frame_delays_count = 1;
+    desc->frame_map[0] = 0;
+    desc->frame_map_length = 1;
+    m_Data = desc;
+    m_Surface = surface;
+    if (m_Surface)
+        m_Surface->AddRef();
+}
+
+CTexture::CTexture(CSurface* surface, const std::vector<UVRect>& parts, uint16_t frameWidth, uint16_t frameHeight)
+{
+    TextureDesc* desc = NewDesc(static_cast<uint16_t>(parts.size()));
+    for (size_t i = 0; i < parts.size(); ++i)
+        desc->Parts()[i] = parts[i];
+    desc->frame_width = frameWidth;
+    desc->frame_height = frameHeight;
+    desc->frame_delays_count = 1;
+    desc->frame_delays[0] = 0;
+    desc->frame_map[0] = 0;
+    desc->frame_map_length = 1;
+    m_Data = desc;
+    m_Surface = surface;
+    if (m_Surface)
+        m_Surface->AddRef();
+}
+
+CTexture::CTexture(CSurface* surface, const TextureDesc* staticDesc)
+{
+    Assign(surface, staticDesc);
+}
+
+CTexture::CTexture(const CTexture& other) { Assign(other.m_Surface, other.m_Data); }
+
+CTexture& CTexture::operator=(const CTexture& other)
+{
+    if (this != &other) {
+        CSurface* surface = other.m_Surface;
+        const TextureDesc* data = other.m_Data;
+        // Copy before freeing: `other` may hold the only reference to what we share.
+        TextureDesc* copy = data && !(data->flags & TextureDesc::FlagStatic) ? CopyDesc(data) : nullptr;
+        if (surface)
+            surface->AddRef();
+        Free();
+        m_Surface = surface;
+        m_Data = copy ? copy : const_cast<TextureDesc*>(data);
+    }
+    return *this;
+}
+
+CTexture::~CTexture() { Free(); }
+
+void CTexture::Assign(CSurface* surface, const TextureDesc* data)
+{
+    m_Surface = surface;
+    if (m_Surface)
+        m_Surface->AddRef();
+    if (!data)
+        m_Data = nullptr;
+    else if (data->flags & TextureDesc::FlagStatic)
+        m_Data = const_cast<TextureDesc*>(data);
+    else
+        m_Data = CopyDesc(data);
+}
+
+void CTexture::Free()
+{
+    if (m_Surface)
+        m_Surface->Release();
+    m_Surface = nullptr;
+    if (m_Data && !(m_Data->flags & TextureDesc::FlagStatic))
+        DeleteDesc(m_Data);
+    m_Data = nullptr;
+}
+
+UVRect CTexture::GetSurfaceRect() const
+{
+    OX_ASSERT(m_Data != 0);
+    if (!m_Data || m_Data->parts_amount == 0)
+        return {};
+    return m_Data->Parts()[0];
+}
+
+UVRect CTexture::GetFrameSurfaceRect(unsigned frame) const
+{
+    OX_ASSERT(m_Data != 0);
+    if (!m_Data || m_Data->parts_amount == 0)
+        return {};
+    return m_Data->Parts()[frame < m_Data->parts_amount ? frame : 0];
+}
+
+unsigned CTexture::GetFramesCount() const { return m_Data ? m_Data->parts_amount : 0; }
+
+uint16_t CTexture::GetWidth() const
+{
+    OX_ASSERT(m_Data != 0);
+    return m_Data ? m_Data->frame_width : 0;
+}
+
+uint16_t CTexture::GetHeight() const
+{
+    OX_ASSERT(m_Data != 0);
+    return m_Data ? m_Data->frame_height : 0;
+}
+
+bool CTexture::IsAnimated() const { return EnumFrames() > 1; }
+
+unsigned CTexture::EnumFrames() const
+{
+    OX_ASSERT(m_Data != 0);
+    return m_Data ? m_Data->frame_delays_count : 0;
+}
+
+} // namespace ox::graphics

@@ -1,0 +1,476 @@
+// oxmedia: image content for the game. Generates test images, converts images to the PVR
+// containers, builds the alpha-mask table, and describes media files, all with the code
+// the game reads them with.
+#include "core/TexturesAlpha.h"
+#include "diag/Log.h"
+#include "misc/imagelib/ImageLib.h"
+#include "misc/imagelib/MediaWriter.h"
+#include "misc/imagelib/PvrContainer.h"
+
+#include <cstdio>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <string>
+#include <unistd.h>
+#include <vector>
+
+namespace fs = std::filesystem;
+using namespace ox::misc::imagelib;
+
+namespace {
+
+const char* kUsage =
+    "usage: oxmedia png <out.png> [options]                 write a test pattern as PNG\n"
+    "       oxmedia jpeg <out.jpg> [options]                write a test pattern as JPEG\n"
+    "       oxmedia pvr <image> <out.pvr|out.pvrlzo> [--format NAME]\n"
+    "                                                       convert a PNG or JPEG to a container\n"
+    "       oxmedia alpha <out.bindump> [--order O] [ID=]IMAGE...\n"
+    "                                                       build the alpha-mask table\n"
+    "       oxmedia info FILE...                            describe images, containers, tables\n"
+    "       oxmedia COMMAND --help                          details of one command\n";
+
+const char* kPngHelp =
+    "usage: oxmedia png <out.png> [--size WxH] [--pattern NAME] [--layout L] [--depth N] [--interlace]\n"
+    "\n"
+    "Writes a generated image. --size defaults to 64x64, --pattern to checker.\n"
+    "Patterns: checker, gradient, circle (opaque disc on transparent), stripes\n"
+    "(transparent and opaque columns), noise (random channels, the same every time).\n"
+    "Layouts: rgba (default), rgb, palette (with a transparency table; up to 256\n"
+    "colours, 1 to 8 bits as needed), grey, greyalpha. --depth: 8 (default) or 16;\n"
+    "grey also takes 1, 2 or 4. --interlace writes Adam7 interlacing.\n";
+
+const char* kJpegHelp =
+    "usage: oxmedia jpeg <out.jpg> [--size WxH] [--pattern NAME] [--quality Q] [--grey] [--progressive]\n"
+    "\n"
+    "Writes a generated image as JPEG (RGB, or one grey channel with --grey); alpha is\n"
+    "dropped. --quality 0 to 100, default 90. Sizes and patterns as for png.\n";
+
+const char* kPvrHelp =
+    "usage: oxmedia pvr <image.png|image.jpg> <out.pvr|out.pvrlzo> [--format NAME]\n"
+    "\n"
+    "Converts an image to the PVR texture container; an output name ending in .pvrlzo\n"
+    "gets the LZO-compressed form. Formats (default argb8888):\n";
+
+const char* kAlphaHelp =
+    "usage: oxmedia alpha <out.bindump> [--order auto|rows|columns] [ID=]IMAGE...\n"
+    "\n"
+    "Builds properties/texturesalpha.bindump: one run-length mask per image, a pixel\n"
+    "being solid when its alpha is not 0. The id is the texture id the game asks with;\n"
+    "without ID= it is the image's file name without folder and extension. Images of\n"
+    "one answer everywhere take no runs. --order picks the scan order; auto (default)\n"
+    "takes whichever gives fewer runs.\n";
+
+const char* kInfoHelp =
+    "usage: oxmedia info FILE...\n"
+    "\n"
+    "Prints the size of PNG and JPEG images, the size and surface format of .pvr and\n"
+    ".pvrlzo containers, and the masks of an alpha-mask table.\n";
+
+// Log lines of the library go to a temporary file; the warnings and errors among them
+// are shown on standard error, since they say why a file was refused.
+class LogToStderr {
+public:
+    LogToStderr() : m_Path((fs::temp_directory_path() / ("oxmedia-" + std::to_string(getpid()) + ".log")).string())
+    {
+        ox::diag::Log::Instance().SetFile(m_Path);
+    }
+    ~LogToStderr()
+    {
+        ox::diag::Log::Instance().Close();
+        std::ifstream in(m_Path);
+        for (std::string line; std::getline(in, line);) {
+            size_t at = line.find("][3]: ");
+            if (at == std::string::npos)
+                at = line.find("][2]: ");
+            if (at != std::string::npos)
+                fprintf(stderr, "  %s\n", line.substr(at + 6).c_str());
+        }
+        std::error_code ignored;
+        fs::remove(m_Path, ignored);
+    }
+
+private:
+    std::string m_Path;
+};
+
+int UsageError(const std::string& message, const char* usage = kUsage)
+{
+    fprintf(stderr, "oxmedia: %s\n%s", message.c_str(), usage);
+    return 2;
+}
+
+bool ReadWhole(const std::string& path, std::vector<uint8_t>& out)
+{
+    std::ifstream in(path, std::ios::binary);
+    if (!in)
+        return false;
+    std::stringstream buffer;
+    buffer << in.rdbuf();
+    std::string text = buffer.str();
+    out.assign(text.begin(), text.end());
+    return true;
+}
+
+// Writes beside the target, then renames: a failed run leaves the old file.
+bool WriteAtomically(const std::string& path, const std::vector<uint8_t>& bytes)
+{
+    std::string temporary = path + ".tmp";
+    {
+        std::ofstream out(temporary, std::ios::binary | std::ios::trunc);
+        if (!out)
+            return false;
+        out.write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
+        if (!out.flush())
+            return false;
+    }
+    std::error_code error;
+    fs::rename(temporary, path, error);
+    return !error;
+}
+
+bool Write(const std::string& path, const std::vector<uint8_t>& bytes)
+{
+    if (WriteAtomically(path, bytes))
+        return true;
+    fprintf(stderr, "oxmedia: cannot write %s\n", path.c_str());
+    return false;
+}
+
+bool Decode(const std::string& path, Image& image)
+{
+    std::unique_ptr<CImageDecoder> decoder = MakeDecoder(path.c_str());
+    if (!decoder) {
+        fprintf(stderr, "oxmedia: %s: only .png and .jpg images can be read\n", path.c_str());
+        return false;
+    }
+    std::vector<uint8_t> data;
+    if (!ReadWhole(path, data)) {
+        fprintf(stderr, "oxmedia: cannot read %s\n", path.c_str());
+        return false;
+    }
+    decoder->SetName(path);
+    if (!decoder->Decode(data.data(), data.size(), image)) {
+        fprintf(stderr, "oxmedia: %s is not a valid image\n", path.c_str());
+        return false;
+    }
+    return true;
+}
+
+// Options shared by the generators: --size WxH and --pattern NAME.
+struct Generated {
+    uint32_t width = 64, height = 64;
+    std::string pattern = "checker";
+};
+
+// Reads "--name value" pairs into `take`; true when every argument was used.
+template <class Take>
+bool Options(int argc, char** argv, int first, std::vector<std::string>& positional, Take take, std::string& error)
+{
+    for (int i = first; i < argc; ++i) {
+        std::string arg = argv[i];
+        if (arg.rfind("--", 0) != 0) {
+            positional.push_back(arg);
+            continue;
+        }
+        const char* value = i + 1 < argc ? argv[i + 1] : nullptr;
+        int used = take(arg, value);
+        if (used < 0) {
+            error = "bad option " + arg + (value && used == -2 ? std::string(" ") + value : "");
+            return false;
+        }
+        i += used;
+    }
+    return true;
+}
+
+int TakeGenerated(Generated& g, const std::string& arg, const char* value)
+{
+    if (arg == "--size") {
+        unsigned w = 0, h = 0;
+        char tail = 0;
+        if (!value || sscanf(value, "%ux%u%c", &w, &h, &tail) != 2 || w == 0 || h == 0 || w > 16384 || h > 16384)
+            return -2;
+        g.width = w;
+        g.height = h;
+        return 1;
+    }
+    if (arg == "--pattern") {
+        if (!value)
+            return -1;
+        g.pattern = value;
+        return 1;
+    }
+    return -1;
+}
+
+bool WantsHelp(int argc, char** argv)
+{
+    for (int i = 2; i < argc; ++i)
+        if (strcmp(argv[i], "--help") == 0 || strcmp(argv[i], "-h") == 0)
+            return true;
+    return false;
+}
+
+bool MakePixels(const Generated& g, std::vector<uint32_t>& pixels)
+{
+    if (MakePattern(g.pattern, g.width, g.height, pixels))
+        return true;
+    fprintf(stderr, "oxmedia: unknown pattern %s (known: %s)\n", g.pattern.c_str(), PatternNames());
+    return false;
+}
+
+int Png(int argc, char** argv)
+{
+    Generated g;
+    PngOptions options;
+    std::vector<std::string> files;
+    std::string error;
+    bool ok = Options(argc, argv, 2, files, [&](const std::string& arg, const char* value) {
+        if (arg == "--interlace") {
+            options.interlaced = true;
+            return 0;
+        }
+        if (arg == "--depth") {
+            options.bit_depth = value ? atoi(value) : 0;
+            return options.bit_depth > 0 ? 1 : -2;
+        }
+        if (arg == "--layout") {
+            const std::string v = value ? value : "";
+            if (v == "rgba") options.layout = PngLayout::Rgba;
+            else if (v == "rgb") options.layout = PngLayout::Rgb;
+            else if (v == "palette") options.layout = PngLayout::Palette;
+            else if (v == "grey") options.layout = PngLayout::Grey;
+            else if (v == "greyalpha") options.layout = PngLayout::GreyAlpha;
+            else return -2;
+            return 1;
+        }
+        return TakeGenerated(g, arg, value);
+    }, error);
+    if (!ok)
+        return UsageError(error, kPngHelp);
+    if (files.size() != 1)
+        return UsageError("png needs one output file", kPngHelp);
+    std::vector<uint32_t> pixels;
+    if (!MakePixels(g, pixels))
+        return 1;
+    std::vector<uint8_t> png;
+    if (!EncodePng(pixels.data(), g.width, g.height, png, options))
+        return 1;
+    return Write(files[0], png) ? 0 : 1;
+}
+
+int Jpeg(int argc, char** argv)
+{
+    Generated g;
+    int quality = 90;
+    bool grey = false, progressive = false;
+    std::vector<std::string> files;
+    std::string error;
+    bool ok = Options(argc, argv, 2, files, [&](const std::string& arg, const char* value) {
+        if (arg == "--grey" || arg == "--progressive") {
+            (arg == "--grey" ? grey : progressive) = true;
+            return 0;
+        }
+        if (arg == "--quality") {
+            char* end = nullptr;
+            long q = value ? strtol(value, &end, 10) : -1;
+            if (!value || *end || q < 0 || q > 100)
+                return -2;
+            quality = int(q);
+            return 1;
+        }
+        return TakeGenerated(g, arg, value);
+    }, error);
+    if (!ok)
+        return UsageError(error, kJpegHelp);
+    if (files.size() != 1)
+        return UsageError("jpeg needs one output file", kJpegHelp);
+    std::vector<uint32_t> pixels;
+    if (!MakePixels(g, pixels))
+        return 1;
+    std::vector<uint8_t> jpeg;
+    if (!EncodeJpeg(pixels.data(), g.width, g.height, quality, jpeg, grey, progressive))
+        return 1;
+    return Write(files[0], jpeg) ? 0 : 1;
+}
+
+bool EndsWith(const std::string& text, const char* tail)
+{
+    size_t n = strlen(tail);
+    return text.size() >= n && text.compare(text.size() - n, n, tail) == 0;
+}
+
+int Pvr(int argc, char** argv)
+{
+    std::string help = std::string(kPvrHelp) + PvrFormatNames();
+    int format = PvrARGB8888;
+    std::vector<std::string> files;
+    std::string error;
+    bool ok = Options(argc, argv, 2, files, [&](const std::string& arg, const char* value) {
+        if (arg != "--format")
+            return -1;
+        format = value ? PvrFormatByName(value) : -1;
+        return format >= 0 ? 1 : -2;
+    }, error);
+    if (!ok)
+        return UsageError(error, help.c_str());
+    if (files.size() != 2)
+        return UsageError("pvr needs an image and an output file", help.c_str());
+    Image image;
+    if (!Decode(files[0], image))
+        return 1;
+    std::vector<uint8_t> pvr;
+    if (!EncodePvr(image.pixels.data(), image.width, image.height, unsigned(format), pvr))
+        return 1;
+    if (EndsWith(files[1], ".pvrlzo")) {
+        std::vector<uint8_t> packed;
+        if (!CompressPvrLzo(pvr.data(), pvr.size(), packed)) {
+            fprintf(stderr, "oxmedia: LZO compression failed\n");
+            return 1;
+        }
+        pvr.swap(packed);
+    }
+    return Write(files[1], pvr) ? 0 : 1;
+}
+
+int Alpha(int argc, char** argv)
+{
+    int order = 0;
+    std::vector<std::string> args;
+    std::string error;
+    bool ok = Options(argc, argv, 2, args, [&](const std::string& arg, const char* value) {
+        if (arg != "--order" || !value)
+            return -1;
+        std::string v = value;
+        order = v == "auto" ? 0 : v == "rows" ? 1 : v == "columns" ? 2 : -1;
+        return order >= 0 ? 1 : -2;
+    }, error);
+    if (!ok)
+        return UsageError(error, kAlphaHelp);
+    if (args.size() < 2)
+        return UsageError("alpha needs an output file and at least one image", kAlphaHelp);
+    std::vector<ox::core::AlphaMaskSource> sources;
+    for (size_t i = 1; i < args.size(); ++i) {
+        ox::core::AlphaMaskSource source;
+        std::string path = args[i];
+        size_t equals = path.find('=');
+        if (equals != std::string::npos) {
+            source.id = path.substr(0, equals);
+            path = path.substr(equals + 1);
+        } else {
+            source.id = fs::path(path).stem().string();
+        }
+        Image image;
+        if (!Decode(path, image))
+            return 1;
+        source.width = image.width;
+        source.height = image.height;
+        source.pixels = std::move(image.pixels);
+        source.order = order;
+        sources.push_back(std::move(source));
+    }
+    std::vector<uint8_t> table;
+    if (!ox::core::BuildTexturesAlpha(sources, table, &error)) {
+        fprintf(stderr, "oxmedia: %s\n", error.c_str());
+        return 1;
+    }
+    if (!Write(args[0], table))
+        return 1;
+    printf("%s: %zu masks, %zu bytes\n", args[0].c_str(), sources.size(), table.size());
+    return 0;
+}
+
+int Info(int argc, char** argv)
+{
+    if (argc < 3)
+        return UsageError("info needs a file", kInfoHelp);
+    int status = 0;
+    for (int i = 2; i < argc; ++i) {
+        std::string path = argv[i];
+        std::vector<uint8_t> data;
+        if (!ReadWhole(path, data)) {
+            fprintf(stderr, "oxmedia: cannot read %s\n", path.c_str());
+            status = 1;
+            continue;
+        }
+        bool ok = false;
+        if (std::unique_ptr<CImageDecoder> decoder = MakeDecoder(path.c_str())) {
+            decoder->SetName(path);
+            uint32_t w = 0, h = 0;
+            if ((ok = decoder->GetInfo(data.data(), data.size(), w, h)))
+                printf("%s: %ux%u\n", path.c_str(), w, h);
+        } else if (EndsWith(path, ".pvr") || EndsWith(path, ".pvrlzo")) {
+            auto show = [&](const void* bytes, size_t size) {
+                PvrTexture t;
+                if (!PvrParse(bytes, size, path.c_str(), t))
+                    return false;
+                printf("%s: %ux%u, surface format %u, %zu bytes of texture\n", path.c_str(), t.width, t.height,
+                       t.internal_format, t.size);
+                return true;
+            };
+            ok = EndsWith(path, ".pvrlzo") ? PvrDecompressLzo(data.data(), data.size(), path.c_str(), show)
+                                           : show(data.data(), data.size());
+        } else if (EndsWith(path, ".bindump")) {
+            std::vector<uint32_t> aligned((data.size() + 3) / 4);
+            memcpy(aligned.data(), data.data(), data.size());
+            ox::core::CTexturesAlpha store;
+            if ((ok = store.LoadFromMemory(aligned.data(), data.size(), path.c_str()))) {
+                printf("%s: %u masks\n", path.c_str(), store.Count());
+                const auto* records = reinterpret_cast<const ox::core::TextureAlphaDesc*>(
+                    reinterpret_cast<const uint8_t*>(aligned.data()) + sizeof(ox::core::TexturesAlphaHeader));
+                for (uint32_t r = 0; r < store.Count(); ++r) {
+                    const ox::core::TextureAlphaDesc& d = records[r];
+                    if (d.uniform)
+                        printf("  %s %ux%u uniform %s\n", d.id.c_str(), d.width, d.height,
+                               d.uniform_value ? "solid" : "clear");
+                    else
+                        printf("  %s %ux%u %u runs by %s\n", d.id.c_str(), d.width, d.height, d.size / 2,
+                               d.order == 1 ? "rows" : "columns");
+                }
+            }
+        } else {
+            fprintf(stderr, "oxmedia: %s: unknown kind of file\n", path.c_str());
+        }
+        if (!ok) {
+            fprintf(stderr, "oxmedia: %s is not valid\n", path.c_str());
+            status = 1;
+        }
+    }
+    return status;
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    if (argc < 2)
+        return UsageError("no command");
+    std::string command = argv[1];
+    if (command == "--help" || command == "-h") {
+        fputs(kUsage, stdout);
+        return 0;
+    }
+    struct Command {
+        const char* name;
+        int (*run)(int, char**);
+        const char* help;
+    } commands[] = {
+        {"png", Png, kPngHelp}, {"jpeg", Jpeg, kJpegHelp}, {"pvr", Pvr, kPvrHelp},
+        {"alpha", Alpha, kAlphaHelp}, {"info", Info, kInfoHelp},
+    };
+    for (const Command& c : commands) {
+        if (command != c.name)
+            continue;
+        if (WantsHelp(argc, argv)) {
+            fputs(c.help, stdout);
+            if (c.run == Pvr)
+                fputs(PvrFormatNames().c_str(), stdout);
+            return 0;
+        }
+        LogToStderr log;
+        return c.run(argc, argv);
+    }
+    return UsageError("unknown command " + command);
+}
