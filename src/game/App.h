@@ -5,6 +5,7 @@
 #include "core/TimeManager.h"
 #include "core/platform/StandaloneApplicationSdl.h"
 #include "game/DemoScene.h"
+#include "game/FontImages.h"
 
 #include <cstdio>
 #include <memory>
@@ -37,6 +38,8 @@ public:
 private:
     void RedirectOutput();
     void CloseOutput();
+    // The frame-rate overlay, when the debug level and show_fps ask for it.
+    void DrawFps(ox::graphics::CRenderer* renderer);
 
     ox::core::CGroupTimerWrapper m_MainTimer;
     ox::wstring m_GameFolder;
@@ -45,6 +48,8 @@ private:
     InitFailure m_InitFailure = InitFailure::None;
     // Drawn until the game's windows exist.
     std::unique_ptr<CDemoScene> m_Demo;
+    // Serves the fonts' glyph images until the texture manager does.
+    std::unique_ptr<CFontImages> m_FontImages;
     bool m_OutputRedirected = false;
 };
 
