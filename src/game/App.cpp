@@ -117,6 +117,7 @@ bool CApp::Init()
         core::ReadWString(settings, "show_fps_font", g_ShowFpsFont);
 
     m_ResourceDeclarations.Load("properties/fonts.xml", nullptr);
+    // (The texture declarations and the sounds load here: a font names its texture.)
     // The fonts find their glyph images by image id. Until the texture manager serves them,
     // the images are read from "<id>.png".
     m_FontImages = std::make_unique<CFontImages>(m_Renderer);
