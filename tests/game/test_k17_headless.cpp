@@ -103,6 +103,8 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_TRUE(LogHasInOrder(log, {"[app][1]: app created", "[app][1]: app init...", "[app][1]: app init complete...",
                                     "[app][1]: app destroyed"}))
         << log;
+    EXPECT_EQ(log.find("[font]"), std::string::npos) << "the demo's fonts load:\n" << log;
+    EXPECT_EQ(log.find("assertion failed"), std::string::npos) << log;
     EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
     EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
 }
