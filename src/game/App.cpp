@@ -1,10 +1,12 @@
 #include "game/App.h"
 
+#include "core/FontManager.h"
 #include "core/SettingsReaders.h"
 #include "diag/Log.h"
 #include "lua/LuaBinding.h"
 #include "lua/LuaHeap.h"
 #include "lua/mluabind/StdBinding.h"
+#include "graphics/Font.h"
 #include "misc/Unicode.h"
 #include "misc/sys/Path.h"
 
@@ -46,6 +48,9 @@ CApp::CApp() = default;
 CApp::~CApp()
 {
     m_Demo.reset();
+    // The fonts keep their metrics; their images go with this application.
+    core::CFontManager::Instance().SetTextureLookup(nullptr);
+    m_FontImages.reset();
     CloseOutput();
     m_GameFolder.clear();
     m_Lua.reset();
@@ -89,8 +94,9 @@ bool CApp::Init()
     // Later subsystems join the start here, in this order: the clip loader's flag after the
     // Lua heap size; the framework's, the game's and the quest engine's script vocabularies
     // with the main script host; after the window the player's options, profiles, music and
-    // records before scripts/main.lua; after show_fps the particle, clip, font, texture and
-    // sound declarations, the quest data and the edit widget's forbidden characters.
+    // records before scripts/main.lua; after show_fps the particle and clip declarations;
+    // after the font declarations the texture declarations and the sounds; after the fonts
+    // the quest data and the edit widget's forbidden characters.
     lua::SetLuaHeapSize(0xA00000);
     m_Adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
     SetSystemIntegration(m_Adapter.get());
@@ -129,6 +135,15 @@ bool CApp::Init()
     core::ReadBool(settings, "show_fps", g_ShowFps);
     if (g_ShowFps)
         core::ReadWString(settings, "show_fps_font", g_ShowFpsFont);
+
+    m_ResourceDeclarations.Load("properties/fonts.xml", nullptr);
+    // (The texture declarations and the sounds load here: a font names its texture.)
+    // The fonts find their glyph images by image id. Until the texture manager serves them,
+    // the images are read from "<id>.png".
+    m_FontImages = std::make_unique<CFontImages>(m_Renderer);
+    core::CFontManager& fonts = core::CFontManager::Instance();
+    fonts.SetTextureLookup([images = m_FontImages.get()](const char* id) { return images->Get(id); });
+    fonts.LoadGroup(m_ResourceDeclarations, nullptr);
     return true;
 }
 
@@ -156,8 +171,42 @@ void CApp::ProcessEvent()
 void CApp::DoDraw(graphics::CRenderer* renderer)
 {
     CApplication::DoDraw(renderer);
+    if (m_FontImages)
+        m_FontImages->Restore();
     if (m_Demo)
         m_Demo->Draw(*renderer, m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
+    DrawFps(renderer);
+}
+
+void CApp::DrawFps(graphics::CRenderer* renderer)
+{
+    if (m_DebugLevel <= core::DebugNone || !g_ShowFps)
+        return;
+    // Program-lifetime state of the overlay: the font once found, the frames of the current
+    // second, the count shown, and the clock of the seconds.
+    static const graphics::CFont* font = nullptr;
+    static unsigned frames = 0;
+    static unsigned shown = 0;
+    static core::CTimer* timer = nullptr;
+    static unsigned lastSecond = 0;
+    if (!font)
+        font = core::CFontManager::Instance().GetItem(misc::ConvertToNarrow(g_ShowFpsFont).c_str());
+    if (!font)
+        return;
+    ++frames;
+    if (!timer) {
+        timer = core::GetTimeManager().AttachTimer(core::GetTimeManager().GetRoot());
+        lastSecond = timer->GetTime();
+    }
+    if (timer->GetTime() >= lastSecond + 1000) {
+        shown = frames;
+        frames = 0;
+        lastSecond = timer->GetTime();
+    }
+    wchar buffer[255];
+    misc::StringFormat(buffer, 255, u"%d", static_cast<int>(shown));
+    renderer->RenderString(font, buffer, 0, 0, graphics::JustifyLeft, graphics::JustifyTop, 1.0f,
+                           graphics::Color(0xFFFFFFFFu), graphics::Color(0u));
 }
 
 void CApp::DoUpdate()

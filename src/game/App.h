@@ -6,6 +6,7 @@
 #include "core/platform/StandaloneApplicationSdl.h"
 #include "game/DemoScene.h"
 #include "lua/Lua.h"
+#include "game/FontImages.h"
 
 #include <cstdio>
 #include <memory>
@@ -41,6 +42,8 @@ private:
     void RedirectOutput();
     void CloseOutput();
     void BindScripts();
+    // The frame-rate overlay, when the debug level and show_fps ask for it.
+    void DrawFps(ox::graphics::CRenderer* renderer);
 
     ox::core::CGroupTimerWrapper m_MainTimer;
     std::unique_ptr<ox::lua::CLua> m_Lua;
@@ -50,6 +53,8 @@ private:
     InitFailure m_InitFailure = InitFailure::None;
     // Drawn until the game's windows exist.
     std::unique_ptr<CDemoScene> m_Demo;
+    // Serves the fonts' glyph images until the texture manager does.
+    std::unique_ptr<CFontImages> m_FontImages;
     bool m_OutputRedirected = false;
 };
 

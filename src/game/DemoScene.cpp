@@ -1,5 +1,9 @@
 #include "game/DemoScene.h"
 
+#include "core/FontManager.h"
+#include "graphics/Font.h"
+#include "misc/StringTable.h"
+
 #include <cmath>
 
 namespace k17 {
@@ -103,6 +107,40 @@ void CDemoScene::Draw(graphics::CRenderer& r, unsigned timeMs)
     r.PopState();
     r.RenderTextureTriangle(m_Texture.get(), {600, 80}, {680, 200}, {540, 200}, {0.5f, 0}, {1, 1}, {0, 1},
                             Color(0xFFFFFFFFu));
+    DrawText(r, t);
+}
+
+void CDemoScene::DrawText(graphics::CRenderer& r, float t)
+{
+    using Renderer = graphics::CRenderer;
+    core::CFontManager& fonts = core::CFontManager::Instance();
+    const graphics::CFont* title = fonts.GetItem("title");
+    const graphics::CFont* small = fonts.GetItem("small");
+    const misc::CStringTable& strings = misc::CStringTable::Instance();
+
+    // The game's name and the Cyrillic entry of the string table, in the title font.
+    if (title) {
+        r.RenderString(title, strings.FormatByStringsID("$1"), 512, 40, graphics::JustifyCenterH,
+                       graphics::JustifyTop);
+        const auto pulse = static_cast<int16_t>(180 + 75 * std::sin(t * 3));
+        r.RenderString(title, strings.FormatByStringsID("$2"), 984, 728, graphics::JustifyRight,
+                       graphics::JustifyBottom, 1.0f, Color(255, pulse, 80, 255));
+    }
+    if (!small)
+        return;
+    // A paragraph broken at word ends and justified, over a back colour.
+    const misc::IntRect box(290, 520, 420, 60);
+    r.RenderFilledPoly4(misc::RectToPoly4({287, 517, 426, 76}), Color(0xA0000000u));
+    r.RenderText(*small,
+                 u"Text is laid out in boxes: lines break at blanks, a word longer than the box breaks "
+                 u"inside, and the lines are justified to the box.",
+                 box, Renderer::TextWordWrap | Renderer::TextJustify, 0, Color(0xFFE8E0C0u));
+    // A selection sweeping over a line, and underlined text.
+    const wstring line = u"A selection sweeps over this line of text";
+    const int first = static_cast<int>(t * 8) % static_cast<int>(line.size());
+    r.RenderText(*small, line, misc::IntRect(300, 470, 400, 30), Renderer::TextCenterH, 0, Color(0xFFFFFFFFu),
+                 Color(0u), Color(0xFF101010u), Color(0xFFF0C040u), first, first + 8);
+    r.RenderText(*small, u"underlined", misc::IntRect(60, 440, 200, 30), Renderer::TextUnderline);
 }
 
 } // namespace k17

@@ -18,6 +18,9 @@ public:
     void ReleaseDeviceResources(bool forReset) override;
 
 private:
+    // Text in the demo's fonts, when they are loaded.
+    void DrawText(ox::graphics::CRenderer& renderer, float timeSeconds);
+
     ox::graphics::CRenderer& m_Renderer;
     std::vector<uint32_t> m_Pixels;
     std::unique_ptr<ox::graphics::CSurface> m_Surface;

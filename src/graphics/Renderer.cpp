@@ -3,6 +3,7 @@
 #include "core/Application.h"
 #include "core/SystemIntegration.h"
 #include "diag/Log.h"
+#include "graphics/TextRender.h"
 #include "graphics/Texture.h"
 
 #include <algorithm>
@@ -17,7 +18,8 @@ using misc::Poly4;
 CRenderer::CRenderer() : CRenderer(CreateDefaultBackend()) {}
 
 CRenderer::CRenderer(std::unique_ptr<IRenderBackend> backend)
-    : m_Backend(std::move(backend)), m_Device(std::make_unique<RenderDevice>(m_Backend.get()))
+    : m_Backend(std::move(backend)), m_TextRender(std::make_unique<CTextRender>()),
+      m_Device(std::make_unique<RenderDevice>(m_Backend.get()))
 {
     SetRenderBackend(m_Backend.get());
     SetRenderDevice(m_Device.get());
@@ -519,6 +521,60 @@ void CRenderer::DrawBox(const CTexture* texture, const FloatRect& dest, const UV
         y += r2;
     }
     row(y, ch, vs[2], vs[3]);
+}
+
+// Text ---------------------------------------------------------------------------------
+
+void CRenderer::RenderString(const CFont* font, const wstring& text, float x, float y, int hJustify,
+                             int vJustify, float /*scale*/, const Color& textColor, const Color& backColor)
+{
+    if (!font || text.empty())
+        return;
+    unsigned flags = 0;
+    if (hJustify == JustifyCenterH) {
+        x -= 500;
+        flags |= TextCenterH;
+    } else if (hJustify == JustifyRight) {
+        x -= 1000;
+        flags |= TextRight;
+    }
+    if (vJustify == JustifyCenterV) {
+        y -= 500;
+        flags |= TextCenterV;
+    } else if (vJustify == JustifyBottom) {
+        y -= 1000;
+        flags |= TextBottom;
+    }
+    RenderText(*font, text, misc::IntRect(static_cast<int>(x), static_cast<int>(y), 1000, 1000), flags, 0,
+               textColor, backColor);
+}
+
+void CRenderer::RenderText(const CFont& font, const wstring& text, const misc::IntRect& box, unsigned flags,
+                           unsigned length, const Color& textColor, const Color& backColor)
+{
+    const Color none(0u);
+    RenderText(font, text, box, flags, length, textColor, backColor, none, none, 1, 0);
+}
+
+void CRenderer::RenderText(const CFont& font, const wstring& text, const misc::IntRect& box, unsigned flags,
+                           unsigned length, const Color& textColor, const Color& backColor,
+                           const Color& selTextColor, const Color& selBackColor, int selStart, int selEnd)
+{
+    // A length past the string's end would read beyond it.
+    if (length > text.size())
+        length = static_cast<unsigned>(text.size());
+    if (text.empty())
+        return;
+    m_TextRender->RenderText(*this, &font, text.c_str(), box, flags, length, textColor, backColor, selTextColor,
+                             selBackColor, selStart, selEnd);
+}
+
+void CRenderer::RenderText(const CFont& font, const wchar* text, const misc::IntRect& box, unsigned flags,
+                           unsigned length, const Color& textColor, const Color& backColor,
+                           const Color& selTextColor, const Color& selBackColor, int selStart, int selEnd)
+{
+    m_TextRender->RenderText(*this, &font, text, box, flags, length, textColor, backColor, selTextColor,
+                             selBackColor, selStart, selEnd);
 }
 
 bool CRenderer::ReadBackBuffer(std::vector<uint32_t>& pixels, unsigned& width, unsigned& height,

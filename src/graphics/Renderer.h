@@ -10,6 +10,7 @@
 #include "misc/Poly.h"
 #include "misc/Rect.h"
 #include "misc/Vector.h"
+#include "misc/WideChar.h"
 
 #include <memory>
 #include <vector>
@@ -22,6 +23,8 @@ namespace ox::graphics {
 
 class CSurface;
 class CTexture;
+class CTextRender;
+struct CFont;
 struct UVRect;
 
 enum Justify : int {
@@ -46,6 +49,24 @@ std::unique_ptr<IRenderBackend> CreateDefaultBackend();
 
 class CRenderer {
 public:
+    // Text flags (bit values). TextMeasure clears the alignment and forces one line.
+    enum TextFlags : unsigned {
+        TextMeasure = 1,
+        TextNoWrap = 2,
+        TextWrapOther = 4,
+        TextWordWrap = 8,
+        TextWordEllipsis = 16,
+        TextLeft = 0x20,
+        TextCenterH = 0x40,
+        TextRight = 0x80,
+        TextTop = 0x100,
+        TextCenterV = 0x200,
+        TextBottom = 0x400,
+        TextJustify = 0x800,
+        TextUnderline = 0x1000,
+        TextStrikethrough = 0x2000,
+    };
+
     CRenderer();
     explicit CRenderer(std::unique_ptr<IRenderBackend> backend);
     ~CRenderer();
@@ -59,6 +80,7 @@ public:
     IRenderBackend* GetBackend() const { return m_Backend.get(); }
     RenderDevice& GetDevice() { return *m_Device; }
     CRendererState& GetState() { return m_State; }
+    CTextRender& GetTextRender() { return *m_TextRender; }
 
     bool InitWindow(bool fullscreen, bool bpp32, unsigned width, unsigned height);
     bool InitGraphics();
@@ -141,6 +163,25 @@ public:
     void RenderTextureBox(const CTexture* texture, const misc::FloatRect& dest, const misc::ShortRect& source,
                           const Color& color = Color());
 
+    // One line of text at a point: a 1000 x 1000 box placed by the justifications
+    // (JustifyLeft, JustifyCenterH, JustifyRight; JustifyTop, JustifyCenterV, JustifyBottom).
+    // `scale` is accepted and has no effect. A null font or an empty text draws nothing.
+    void RenderString(const CFont* font, const wstring& text, float x, float y, int hJustify = JustifyLeft,
+                      int vJustify = JustifyTop, float scale = 1.0f, const Color& textColor = Color(),
+                      const Color& backColor = Color(0u));
+    // Text in a box with text flags; `length` 0 draws up to the end. The back colour fills
+    // behind each line unless it is 0 (transparent black).
+    void RenderText(const CFont& font, const wstring& text, const misc::IntRect& box, unsigned flags,
+                    unsigned length = 0, const Color& textColor = Color(), const Color& backColor = Color(0u));
+    // The same with a selection: the characters selStart to selEnd (inclusive) in their
+    // own colour over the selection back colour.
+    void RenderText(const CFont& font, const wstring& text, const misc::IntRect& box, unsigned flags,
+                    unsigned length, const Color& textColor, const Color& backColor, const Color& selTextColor,
+                    const Color& selBackColor, int selStart, int selEnd);
+    void RenderText(const CFont& font, const wchar* text, const misc::IntRect& box, unsigned flags,
+                    unsigned length, const Color& textColor, const Color& backColor, const Color& selTextColor,
+                    const Color& selBackColor, int selStart, int selEnd);
+
     // A copy of an area of the back buffer (source coordinates; empty: the whole window),
     // as top-down 0xAARRGGBB words.
     bool ReadBackBuffer(std::vector<uint32_t>& pixels, unsigned& width, unsigned& height,
@@ -169,6 +210,7 @@ private:
     bool m_Bpp32 = true;
     ResolutionsT m_Resolutions;
     CRendererState m_State;
+    std::unique_ptr<CTextRender> m_TextRender;
     std::unique_ptr<RenderDevice> m_Device;
     bool m_DeviceLost = false;
     int m_SourceWidth = 0;

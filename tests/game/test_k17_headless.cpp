@@ -137,6 +137,10 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
         << run.Output();
     std::string errors = oxtest::ReadFile(run.game / "k17_stderr.txt");
     EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
+    EXPECT_EQ(log.find("[font]"), std::string::npos) << "the demo's fonts load:\n" << log;
+    EXPECT_EQ(log.find("assertion failed"), std::string::npos) << log;
+    EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
+    EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
 }
 
 TEST(GameHeadless, NoDisplayIsAClearErrorAndANonZeroExit)
