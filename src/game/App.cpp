@@ -1,6 +1,8 @@
 #include "game/App.h"
 
 #include "core/SettingsReaders.h"
+#include "core/TextureDeclarations.h"
+#include "core/TextureManager.h"
 #include "diag/Log.h"
 #include "misc/Unicode.h"
 #include "misc/sys/Path.h"
@@ -34,6 +36,23 @@ bool Redirect(int stream, const char* file)
     bool ok = dup2(fd, stream) >= 0;
     close(fd);
     return ok;
+}
+
+// The texture declarations stay for the whole run: the texture manager reads them in place.
+core::CTextureDeclarationsLoader& TextureDeclarations()
+{
+    static auto* loader = new core::CTextureDeclarationsLoader();
+    return *loader;
+}
+
+// The texture declarations go to the texture manager, then the alpha masks are read. A
+// declaration file that cannot be used leaves the manager empty; the game goes on.
+void LoadTextures()
+{
+    core::CTextureManager& manager = core::CTextureManager::Instance();
+    if (TextureDeclarations().Load())
+        manager.Load(&TextureDeclarations());
+    manager.GetTexturesAlpha().Load();
 }
 
 } // namespace
@@ -109,6 +128,9 @@ bool CApp::Init()
     core::ReadBool(settings, "show_fps", g_ShowFps);
     if (g_ShowFps)
         core::ReadWString(settings, "show_fps_font", g_ShowFpsFont);
+
+    LoadTextures();
+    m_Demo->TakeDeclaredTextures();
     return true;
 }
 
