@@ -592,6 +592,8 @@ void FinishImage(Conversion& c)
             surface.flags = image.path.find("!nearest") != std::string::npos ? graphics::CSurface::FlagNearest : 0;
         } else {
             OX_LOG(kChannel, diag::LogError, "Cannot load surface dimensions: \"%s\"", image.path.c_str());
+            OX_LOG(kChannel, diag::LogError, "%s: image \"%s\" has no image file \"%s\"", c.name, image.id.c_str(),
+                   image.path.c_str());
         }
         if (!image.hasCols || !image.hasRows || image.cols < 1 || image.rows < 1) {
             OX_LOG(kChannel, diag::LogWarning, "%s: image \"%s\" without parts needs cols and rows of 1 or more",

@@ -229,6 +229,13 @@ bool CTextureManager::FillFromFile(CSurface& surface)
         if (!loaded)
             OX_LOG(kChannel, diag::LogError, "Cannot load surface data with imagelib: \"%s\"", path);
     }
+    if (!loaded) {
+        // Name the textures that will draw nothing, for the game maker.
+        for (unsigned i = 0; i < m_TexturesCount; ++i)
+            if (m_Textures[i].GetSurface() == &surface)
+                OX_LOG(kChannel, diag::LogError, "Texture \"%s\" has no image: \"%s\"", GetItemId(&m_Textures[i]),
+                       path);
+    }
     // A surface without its image draws nothing rather than what the device had.
     if (!loaded && surface.IsValid() && surface.GetInternalFormat() == graphics::FormatA8R8G8B8) {
         std::vector<uint32_t> clear(size_t(surface.GetWidth()) * surface.GetHeight(), 0);

@@ -181,6 +181,7 @@ void CSurface::ReleaseD3D()
         m_CountedBy = nullptr;
         m_BytesInVMem = 0;
         RemoveFromMRUList();
+        m_LastUsedFrame = 0;  // the next use, in any frame, puts it back on the list
         m_Buffer.reset();
     }
 }

@@ -103,6 +103,9 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_TRUE(LogHasInOrder(log, {"[app][1]: app created", "[app][1]: app init...", "[app][1]: app init complete...",
                                     "[app][1]: app destroyed"}))
         << log;
+    // The declared textures are known, and none of them failed to load.
+    EXPECT_NE(log.find("[texman][0]: Texture information created in"), std::string::npos) << log;
+    EXPECT_EQ(log.find("[texman][3]"), std::string::npos) << log;
     EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
     EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
 }
