@@ -177,7 +177,11 @@ bool CTextureManager::LoadSurface(CSurface* surface)
     if (!surface)
         return false;
     if (!surface->IsValid() && !surface->CreateDeviceTexture()) {
-        OX_LOG(kChannel, diag::LogError, "Can't create surface");
+        // Tried again at every use; said once.
+        if (m_Reported.insert(surface).second) {
+            OX_LOG(kChannel, diag::LogError, "Can't create surface");
+            ReportTextures(*surface);
+        }
         return false;
     }
     if (surface->GetBuffer()) {
@@ -229,13 +233,8 @@ bool CTextureManager::FillFromFile(CSurface& surface)
         if (!loaded)
             OX_LOG(kChannel, diag::LogError, "Cannot load surface data with imagelib: \"%s\"", path);
     }
-    if (!loaded) {
-        // Name the textures that will draw nothing, for the game maker.
-        for (unsigned i = 0; i < m_TexturesCount; ++i)
-            if (m_Textures[i].GetSurface() == &surface)
-                OX_LOG(kChannel, diag::LogError, "Texture \"%s\" has no image: \"%s\"", GetItemId(&m_Textures[i]),
-                       path);
-    }
+    if (!loaded)
+        ReportTextures(surface);
     // A surface without its image draws nothing rather than what the device had.
     if (!loaded && surface.IsValid() && surface.GetInternalFormat() == graphics::FormatA8R8G8B8) {
         std::vector<uint32_t> clear(size_t(surface.GetWidth()) * surface.GetHeight(), 0);
@@ -243,6 +242,15 @@ bool CTextureManager::FillFromFile(CSurface& surface)
                          graphics::FormatA8R8G8B8);
     }
     return loaded;
+}
+
+void CTextureManager::ReportTextures(const CSurface& surface) const
+{
+    // Name the textures that will draw nothing, for the game maker.
+    for (unsigned i = 0; i < m_TexturesCount; ++i)
+        if (m_Textures[i].GetSurface() == &surface)
+            OX_LOG(kChannel, diag::LogError, "Texture \"%s\" has no image: \"%s\"", GetItemId(&m_Textures[i]),
+                   surface.GetFileName());
 }
 
 // Video memory -------------------------------------------------------------------------
@@ -401,6 +409,7 @@ void CTextureManager::RemoveUnusedSurfaces()
                 m_Preload->surfaces_amount = list.size();
             }
         }
+        m_Reported.erase(&*it);
         it = m_Surfaces.erase(it);
     }
     if (m_Preload && m_Preload->current_surface >= m_Preload->surfaces_amount)

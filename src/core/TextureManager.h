@@ -12,6 +12,7 @@
 #include <functional>
 #include <list>
 #include <memory>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -104,6 +105,7 @@ private:
     graphics::CSurface* AddSurface(unsigned width, unsigned height, uint8_t flags, uint8_t format,
                                    const char* fileName);
     bool FillFromFile(graphics::CSurface& surface);
+    void ReportTextures(const graphics::CSurface& surface) const;
 
     misc::CGamePack* m_Pack;
     Clock m_Clock;
@@ -119,6 +121,8 @@ private:
     unsigned m_HighLimit = kHighLimit;
     unsigned m_LowLimit = kLowLimit;
     CTexturesAlpha m_TexturesAlpha;
+    // Surfaces whose device texture could not be made, already logged.
+    std::set<const graphics::CSurface*> m_Reported;
 };
 
 } // namespace ox::core

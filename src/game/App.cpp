@@ -95,8 +95,9 @@ bool CApp::Init()
     // Later subsystems join the start here, in this order: the Lua heap size, the clip
     // loader's flag; after the settings files the main script host and the bindings; after
     // the window the player's options, profiles, music and records; scripts/main.lua and its
-    // Init; then the particle, clip, font, texture and sound declarations, the quest data and
-    // the edit widget's forbidden characters.
+    // Init; then the particle, clip and font declarations (before the textures, below), the
+    // sound declarations (after them), the quest data and the edit widget's forbidden
+    // characters.
     m_Adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
     SetSystemIntegration(m_Adapter.get());
     LimitFPS(50);

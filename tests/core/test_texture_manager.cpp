@@ -251,7 +251,8 @@ TEST_F(ManagerFixture, DeclaredTexturesLoadOnFirstUse)
     folder.Png("img/a.png", 4, 2);
     folder.dir.Write("properties/resources.xml",
                      Declarations("<surfaces><surface path=\"img/a.png\"/><surface path=\"img/gone.png\" width=\"8\" "
-                                  "height=\"8\"/></surfaces><group id=\"g\">"
+                                  "height=\"8\"/><surface path=\"img/lost.png\"/></surfaces><group id=\"g\">"
+                                  "<image id=\"lost\" path=\"img/lost.png\" cols=\"1\" rows=\"1\"/>"
                                   "<image id=\"a\" path=\"img/a.png\" cols=\"1\" rows=\"1\"/>"
                                   "<image id=\"gone\" path=\"img/gone.png\"><part rect_x=\"0\" rect_y=\"0\" "
                                   "rect_w=\"8\" rect_h=\"8\"/></image></group>"));
@@ -290,6 +291,16 @@ TEST_F(ManagerFixture, DeclaredTexturesLoadOnFirstUse)
     EXPECT_TRUE(log.Contains("Cannot load surface data with imagelib: \"img/gone.png\""));
     EXPECT_TRUE(log.Contains("Texture \"gone\" has no image: \"img/gone.png\""));
     EXPECT_EQ(std::vector<unsigned char>(256, 0), empty->bits);
+    // Without even a size (the file was missing when the declarations were compiled): no
+    // device texture, tried at each use, said once.
+    CSurface* lost = manager.GetItem("lost")->GetSurface();
+    EXPECT_EQ(lost->GetD3DTexture(), nullptr);
+    EXPECT_EQ(lost->GetD3DTexture(), nullptr);
+    size_t said = 0;
+    for (const std::string& line : log.Entries())
+        said += line == "texman|3|Can't create surface";
+    EXPECT_EQ(said, 1u);
+    EXPECT_TRUE(log.Contains("Texture \"lost\" has no image: \"img/lost.png\""));
 
     manager.UnloadAllOnDemandSurfaces();
     EXPECT_EQ(manager.GetVideoMemUsed(), 0u);
