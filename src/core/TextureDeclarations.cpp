@@ -371,7 +371,7 @@ std::string_view ElementName(const misc::XmlRecord* stack, int depth)
 
 int ToInt(const std::string& text)
 {
-    return static_cast<int>(strtol(text.c_str(), nullptr, 10));
+    return static_cast<int>(std::clamp(strtol(text.c_str(), nullptr, 10), -0x7FFFFFFFL, 0x7FFFFFFFL));
 }
 
 std::vector<int> ToIntList(const std::string& text)
@@ -429,7 +429,8 @@ void OnAttribute(void* user, misc::XmlRecord*, int, const char* name, size_t nam
                static_cast<int>(nameLength), name);
         return;
     }
-    c.attributes[std::string(name, nameLength)] = std::string(value, valueLength);
+    // Texts of the records end at their first zero byte.
+    c.attributes[std::string(name, strnlen(name, nameLength))] = std::string(value, strnlen(value, valueLength));
 }
 
 void OnStart(void* user, misc::XmlRecord*, int) { static_cast<Conversion*>(user)->attributes.clear(); }
@@ -605,6 +606,11 @@ void FinishImage(Conversion& c)
         frameHeight = surface.height / image.rows;
     }
 
+    if (image.cols > 255 || image.rows > 255 || int64_t(image.cols) * image.rows > int64_t(Loader::MaximumParts)) {
+        OX_LOG(kChannel, diag::LogError, "%s: image \"%s\" has %d x %d frames, more than %zu; ignored", c.name,
+               image.id.c_str(), image.cols, image.rows, Loader::MaximumParts);
+        return;
+    }
     std::vector<int> delays;
     std::vector<int> map;
     const int cells = image.cols * image.rows;

@@ -203,6 +203,14 @@ TEST(TextureDeclarations, FrameMapsForEachAnimationType)
     EXPECT_EQ(Map(d), (std::vector<int> {2, 0, 1}));
     EXPECT_EQ(d->total_time, 18);
     EXPECT_TRUE(log.Contains("frame 9 of the frame map does not exist"));
+
+    // A grid bigger than an image may hold is refused, not allocated.
+    const std::string huge = Declarations("<surfaces><surface path=\"sheet.png\"/></surfaces><group id=\"g\">"
+                                          "<image id=\"x\" path=\"sheet.png\" anim_type=\"loop\" cols=\"99999999999\" "
+                                          "rows=\"90\"/><image id=\"y\" path=\"sheet.png\" cols=\"1\" rows=\"1\"/></group>");
+    ASSERT_TRUE(loader.LoadXml(huge.data(), huge.size(), "r.xml"));
+    EXPECT_EQ(loader.ImagesAmount(), 1u);
+    EXPECT_TRUE(log.Contains("image \"x\" has 2147483647 x 90 frames, more than 512; ignored"));
 }
 
 TEST(TextureDeclarations, BadDumpsAreRefusedWithoutFallingBackToXml)
