@@ -1,6 +1,7 @@
 #include "core/Application.h"
 
 #include "core/SettingsReaders.h"
+#include "core/TextureManager.h"
 #include "core/TimeManager.h"
 #include "diag/Assert.h"
 #include "diag/Log.h"
@@ -101,6 +102,8 @@ bool CApplication::Init()
         OX_LOG("app", diag::LogError, "error in m_SystemIntegration->Init");
         return false;
     }
+    CTextureManager::Instance().SetAllOnDemand(allOnDemand);
+    m_Renderer.AddDeviceResourceOwner(&CTextureManager::Instance());
     // The display modes can be listed once the platform layer is up.
     m_Renderer.EnumResolutions();
     OX_LOG("app", diag::LogInfo, "app init complete...");
@@ -144,8 +147,10 @@ void CApplication::Update()
             return;
     }
     m_FrameLimiter.Wait();
+    graphics::SetFrameNumber(graphics::GetFrameNumber() + 1);
     lua::CLua::StepGarbageCollector();
     GetTimeManager().Update();
+    CTextureManager::Instance().UpdatePreload();
     DoUpdate();
     if (m_ShutdownRequested)
         DoShutdown();

@@ -7,6 +7,7 @@
 #include "core/Settings.h"
 #include "core/SystemIntegration.h"
 #include "graphics/Renderer.h"
+#include "graphics/Texture.h"
 #include "misc/WideChar.h"
 
 #include <functional>
@@ -70,6 +71,8 @@ public:
     bool IsMediaPaused() const { return m_MediaPaused; }
     bool IsShutdownDone() const { return m_ShutdownDone; }
     const CFrameLimiter& GetFrameLimiter() const { return m_FrameLimiter; }
+    // Frames counted by Update, from 1.
+    uint32_t GetFrameNumber() const { return graphics::GetFrameNumber(); }
     MediaPauseHooks& GetMediaPauseHooks() { return m_MediaHooks; }
 
     // The user's data folder of a game: $XDG_DATA_HOME (or ~/.local/share), company, product.

@@ -2,6 +2,7 @@
 
 #include "diag/Assert.h"
 #include "diag/Log.h"
+#include "graphics/Texture.h"
 #include "misc/GamePack.h"
 
 #include <algorithm>
@@ -126,6 +127,12 @@ const TextureAlphaDesc* CTexturesAlpha::Find(const char* id) const
             hi = mid;
     }
     return nullptr;
+}
+
+bool CTexturesAlpha::IsOpaque(const graphics::CTexture& texture, int x, int y) const
+{
+    const char* _from = texture.GetData() ? texture.GetData()->id.c_str() : nullptr;
+    return IsOpaque(_from, x, y);
 }
 
 bool CTexturesAlpha::IsOpaque(const char* _from, int x, int y) const

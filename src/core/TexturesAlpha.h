@@ -12,6 +12,9 @@
 namespace ox::misc {
 class CGamePack;
 }
+namespace ox::graphics {
+class CTexture;
+}
 
 namespace ox::core {
 
@@ -87,6 +90,8 @@ public:
     // runs do not reach, are not solid.
     bool IsOpaque(const char* _from, int x, int y) const;
     bool IsOpaque(const misc::StringA88& id, int x, int y) const { return IsOpaque(id.c_str(), x, y); }
+    // The same for the texture's id (its description must exist).
+    bool IsOpaque(const graphics::CTexture& texture, int x, int y) const;
 
 private:
     void Release();

@@ -2,6 +2,8 @@
 
 #include "core/FontManager.h"
 #include "core/SettingsReaders.h"
+#include "core/TextureDeclarations.h"
+#include "core/TextureManager.h"
 #include "diag/Log.h"
 #include "lua/LuaBinding.h"
 #include "lua/LuaHeap.h"
@@ -41,6 +43,23 @@ bool Redirect(int stream, const char* file)
     return ok;
 }
 
+// The texture declarations stay for the whole run: the texture manager reads them in place.
+core::CTextureDeclarationsLoader& TextureDeclarations()
+{
+    static auto* loader = new core::CTextureDeclarationsLoader();
+    return *loader;
+}
+
+// The texture declarations go to the texture manager, then the alpha masks are read. A
+// declaration file that cannot be used leaves the manager empty; the game goes on.
+void LoadTextures()
+{
+    core::CTextureManager& manager = core::CTextureManager::Instance();
+    if (TextureDeclarations().Load())
+        manager.Load(&TextureDeclarations());
+    manager.GetTexturesAlpha().Load();
+}
+
 } // namespace
 
 CApp::CApp() = default;
@@ -48,9 +67,7 @@ CApp::CApp() = default;
 CApp::~CApp()
 {
     m_Demo.reset();
-    // The fonts keep their metrics; their images go with this application.
     core::CFontManager::Instance().SetTextureLookup(nullptr);
-    m_FontImages.reset();
     CloseOutput();
     m_GameFolder.clear();
     m_Lua.reset();
@@ -95,8 +112,8 @@ bool CApp::Init()
     // Lua heap size; the framework's, the game's and the quest engine's script vocabularies
     // with the main script host; after the window the player's options, profiles, music and
     // records before scripts/main.lua; after show_fps the particle and clip declarations;
-    // after the font declarations the texture declarations and the sounds; after the fonts
-    // the quest data and the edit widget's forbidden characters.
+    // after the textures the sound declarations; after the fonts the quest data and the edit
+    // widget's forbidden characters.
     lua::SetLuaHeapSize(0xA00000);
     m_Adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
     SetSystemIntegration(m_Adapter.get());
@@ -137,12 +154,13 @@ bool CApp::Init()
         core::ReadWString(settings, "show_fps_font", g_ShowFpsFont);
 
     m_ResourceDeclarations.Load("properties/fonts.xml", nullptr);
-    // (The texture declarations and the sounds load here: a font names its texture.)
-    // The fonts find their glyph images by image id. Until the texture manager serves them,
-    // the images are read from "<id>.png".
-    m_FontImages = std::make_unique<CFontImages>(m_Renderer);
+    LoadTextures();
+    m_Demo->TakeDeclaredTextures();
+    // A font finds its glyph image among the declared textures by its image id.
     core::CFontManager& fonts = core::CFontManager::Instance();
-    fonts.SetTextureLookup([images = m_FontImages.get()](const char* id) { return images->Get(id); });
+    fonts.SetTextureLookup([](const char* id) -> const graphics::CTexture* {
+        return core::CTextureManager::Instance().GetItem(id);
+    });
     fonts.LoadGroup(m_ResourceDeclarations, nullptr);
     return true;
 }
@@ -171,8 +189,6 @@ void CApp::ProcessEvent()
 void CApp::DoDraw(graphics::CRenderer* renderer)
 {
     CApplication::DoDraw(renderer);
-    if (m_FontImages)
-        m_FontImages->Restore();
     if (m_Demo)
         m_Demo->Draw(*renderer, m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
     DrawFps(renderer);

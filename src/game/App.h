@@ -6,7 +6,6 @@
 #include "core/platform/StandaloneApplicationSdl.h"
 #include "game/DemoScene.h"
 #include "lua/Lua.h"
-#include "game/FontImages.h"
 
 #include <cstdio>
 #include <memory>
@@ -54,7 +53,6 @@ private:
     // Drawn until the game's windows exist.
     std::unique_ptr<CDemoScene> m_Demo;
     // Serves the fonts' glyph images until the texture manager does.
-    std::unique_ptr<CFontImages> m_FontImages;
     bool m_OutputRedirected = false;
 };
 

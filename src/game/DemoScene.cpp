@@ -51,6 +51,23 @@ CDemoScene::~CDemoScene()
     m_Surface.reset();
 }
 
+void CDemoScene::TakeDeclaredTextures()
+{
+    m_Spinner.Init();
+    m_Spinner.SetTexture("demo_spinner");
+    m_Spinner.SetRect({60, 612, 96, 96});
+    m_Disc.Init();
+    m_Disc.SetTexture("demo_disc");
+    m_Disc.SetRect({180, 612, 96, 96});
+    m_Stone.Init();
+    m_Stone.SetTexture("demo_stone");
+    m_Stone.SetRect({300, 612, 96, 96});
+    m_Frame.Init();
+    m_Frame.SetTexture("demo_frame");
+    m_Frame.SetRect({420, 612, 220, 96});
+    m_Frame.SetFlags(graphics::CImage::FlagBoxImage);
+}
+
 void CDemoScene::ReleaseDeviceResources(bool forReset)
 {
     if (!forReset)
@@ -107,6 +124,12 @@ void CDemoScene::Draw(graphics::CRenderer& r, unsigned timeMs)
     r.PopState();
     r.RenderTextureTriangle(m_Texture.get(), {600, 80}, {680, 200}, {540, 200}, {0.5f, 0}, {1, 1}, {0, 1},
                             Color(0xFFFFFFFFu));
+
+    // The declared textures stand on the floor.
+    m_Spinner.Draw(r);
+    m_Disc.Draw(r);
+    m_Stone.Draw(r);
+    m_Frame.Draw(r);
     DrawText(r, t);
 }
 

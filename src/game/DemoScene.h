@@ -1,6 +1,7 @@
 #pragma once
 // What the game draws until widgets and scenes exist: a cleared canvas and a few
 // primitives of every kind the renderer offers, moving with the main timer.
+#include "graphics/Image.h"
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
 
@@ -16,6 +17,8 @@ public:
 
     void Draw(ox::graphics::CRenderer& renderer, unsigned timeMs);
     void ReleaseDeviceResources(bool forReset) override;
+    // Looks up the game's declared textures (once they are loaded) for the shelf of images.
+    void TakeDeclaredTextures();
 
 private:
     // Text in the demo's fonts, when they are loaded.
@@ -25,6 +28,12 @@ private:
     std::vector<uint32_t> m_Pixels;
     std::unique_ptr<ox::graphics::CSurface> m_Surface;
     std::unique_ptr<ox::graphics::CTexture> m_Texture;
+    // Declared textures: an animated sprite sheet, a disc with holes, a container image and
+    // a framed tile drawn as a nine-part box.
+    ox::graphics::CImage m_Spinner;
+    ox::graphics::CImage m_Disc;
+    ox::graphics::CImage m_Stone;
+    ox::graphics::CImage m_Frame;
 };
 
 } // namespace k17

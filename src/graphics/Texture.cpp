@@ -4,13 +4,15 @@
 #include "diag/Log.h"
 #include "graphics/RenderDevice.h"
 
+#include <algorithm>
 #include <cstring>
 
 namespace ox::graphics {
 
 namespace {
 
-CSurface::Loader g_Loader = nullptr;
+ISurfaceManager* g_Manager = nullptr;
+uint32_t g_FrameNumber = 1;
 
 TextureDesc* NewDesc(uint16_t parts)
 {
@@ -37,16 +39,27 @@ TextureDesc* CopyDesc(const TextureDesc* from)
 
 } // namespace
 
+uint32_t GetFrameNumber() { return g_FrameNumber; }
+void SetFrameNumber(uint32_t frame) { g_FrameNumber = frame; }
+
 // Surface ----------------------------------------------------------------------------
+
+CSurface* CSurface::s_MRUHead = nullptr;
+CSurface* CSurface::s_MRUTail = nullptr;
 
 CSurface::CSurface(uint16_t width, uint16_t height, uint8_t flags, uint8_t internalFormat, const char* fileName)
     : Width(width), Height(height), m_Flags(flags), m_InternalFormat(internalFormat), m_FileName(fileName)
 {
 }
 
-CSurface::~CSurface() { ReleaseD3D(); }
+CSurface::~CSurface()
+{
+    ReleaseD3D();
+    RemoveFromMRUList();
+}
 
-void CSurface::SetLoader(Loader loader) { g_Loader = loader; }
+void CSurface::SetManager(ISurfaceManager* manager) { g_Manager = manager; }
+ISurfaceManager* CSurface::GetManager() { return g_Manager; }
 
 const char* CSurface::GetFileName() const
 {
@@ -65,13 +78,66 @@ CDeviceTexture* CSurface::GetD3DTexture()
 {
     OX_ASSERT((!Surface && !m_BytesInVMem) || (Surface && m_BytesInVMem));
     if (!Surface) {
-        if (g_Loader)
-            g_Loader(*this);
+        if (g_Manager)
+            g_Manager->LoadSurface(this);
         else
             CreateDeviceTexture();
         m_Flags &= static_cast<uint8_t>(~FlagUnloaded);
     }
+    // Only what is in video memory is on the list (a failed load tries again next use).
+    if (Surface && m_LastUsedFrame != g_FrameNumber) {
+        m_LastUsedFrame = g_FrameNumber;
+        MoveToMRUHead();
+    }
     return Surface;
+}
+
+void CSurface::MoveToMRUHead()
+{
+    if (s_MRUHead == this)
+        return;
+    if (!s_MRUHead) {
+        OX_ASSERT(s_MRUTail == 0);
+        OX_ASSERT(m_PrevInMRUList == 0 && m_NextInMRUList == 0);
+        s_MRUHead = s_MRUTail = this;
+        return;
+    }
+    if (IsInMRUList())
+        RemoveFromMRUList();
+    // Now outside the list, which is not empty: put at the head.
+    OX_ASSERT(m_PrevInMRUList == 0);
+    OX_ASSERT(m_NextInMRUList == 0);
+    m_PrevInMRUList = s_MRUHead;
+    s_MRUHead->m_NextInMRUList = this;
+    s_MRUHead = this;
+    if (!s_MRUTail)
+        s_MRUTail = this;
+}
+
+void CSurface::RemoveFromMRUList()
+{
+    if (!IsInMRUList())
+        return;
+    if (s_MRUHead == this && s_MRUTail == this) {
+        OX_ASSERT(m_PrevInMRUList == 0 && m_NextInMRUList == 0);
+        s_MRUHead = s_MRUTail = nullptr;
+    } else if (s_MRUTail == this) {
+        OX_ASSERT(m_PrevInMRUList == 0);
+        OX_ASSERT(m_NextInMRUList != 0);
+        s_MRUTail = m_NextInMRUList;
+        s_MRUTail->m_PrevInMRUList = nullptr;
+    } else if (s_MRUHead == this) {
+        OX_ASSERT(m_NextInMRUList == 0);
+        OX_ASSERT(m_PrevInMRUList != 0);
+        s_MRUHead = m_PrevInMRUList;
+        s_MRUHead->m_NextInMRUList = nullptr;
+    } else {
+        OX_ASSERT(m_PrevInMRUList != 0);
+        OX_ASSERT(m_NextInMRUList != 0);
+        m_PrevInMRUList->m_NextInMRUList = m_NextInMRUList;
+        m_NextInMRUList->m_PrevInMRUList = m_PrevInMRUList;
+    }
+    m_PrevInMRUList = m_NextInMRUList = nullptr;
 }
 
 bool CSurface::CreateDeviceTexture()
@@ -85,12 +151,20 @@ bool CSurface::CreateDeviceTexture()
         OX_LOG("graphics", diag::LogError, "unknown format for windows texture: %d", m_InternalFormat);
         return false;
     }
-    Surface = backend->CreateTexture(Width, Height, m_InternalFormat, (m_Flags & FlagRenderTarget) != 0);
+    const uint64_t bytes = uint64_t(FormatBitsPerPixel(m_InternalFormat)) * Width * Height / 8;
+    // Nothing this big fits a device; the count must stay within 32 bits.
+    Surface = bytes <= 0x40000000u
+                  ? backend->CreateTexture(Width, Height, m_InternalFormat, (m_Flags & FlagRenderTarget) != 0)
+                  : nullptr;
     if (!Surface) {
         CheckResult(ResultOutOfVideoMemory, "Create texture", diag::LogError);
         return false;
     }
-    m_BytesInVMem = FormatBitsPerPixel(m_InternalFormat) * Width * Height / 8;
+    m_BytesInVMem = static_cast<unsigned>(bytes);
+    // Counting may evict others; this surface is not on the list yet, so it stays.
+    m_CountedBy = g_Manager;
+    if (m_CountedBy)
+        m_CountedBy->AddVideoMemory(m_BytesInVMem);
     return true;
 }
 
@@ -102,7 +176,12 @@ void CSurface::ReleaseD3D()
         if (IRenderBackend* backend = GetRenderBackend())
             backend->ReleaseTexture(Surface);
         Surface = nullptr;
+        if (m_CountedBy)
+            m_CountedBy->RemoveVideoMemory(m_BytesInVMem);
+        m_CountedBy = nullptr;
         m_BytesInVMem = 0;
+        RemoveFromMRUList();
+        m_LastUsedFrame = 0;  // the next use, in any frame, puts it back on the list
         m_Buffer.reset();
     }
 }
@@ -293,6 +372,118 @@ unsigned CTexture::EnumFrames() const
 {
     OX_ASSERT(m_Data != 0);
     return m_Data ? m_Data->frame_delays_count : 0;
+}
+
+int CTexture::GetFrameByTime(int ms) const
+{
+    OX_ASSERT(m_Data != 0);
+    if (!m_Data || m_Data->frame_delays_count == 0)
+        return -1;
+    if (m_Data->frame_delays_count == 1)
+        return 0;
+    const unsigned length = std::min<unsigned>(m_Data->frame_map_length, TextureDesc::MaximumFrames);
+    if (length == 0)
+        return -1;
+    if (length == 1)
+        return m_Data->frame_map[0];
+    const int total = m_Data->total_time;
+    if (m_Data->anim_type == TextureDesc::AnimOnce) {
+        if (ms >= total)
+            return m_Data->frame_map[length - 1];
+    } else if (ms > total && total > 0) {
+        ms %= total;
+    }
+    for (unsigned i = 0; i < length; ++i) {
+        const int frame = m_Data->frame_map[i];
+        if (frame >= 0 && frame < static_cast<int>(TextureDesc::MaximumFrames) &&
+            frame < m_Data->frame_delays_count)
+            ms -= m_Data->frame_delays[frame];
+        if (ms < 0)
+            return frame;
+    }
+    return -1;
+}
+
+unsigned CTexture::GetTimeByFrame(unsigned index) const
+{
+    OX_ASSERT(m_Data != 0);
+    if (!m_Data)
+        return 0;
+    const unsigned length = std::min<unsigned>(m_Data->frame_map_length, TextureDesc::MaximumFrames);
+    if (index >= length)
+        return 0;
+    unsigned time = 0;
+    for (unsigned i = 0; i < index; ++i) {
+        const int frame = m_Data->frame_map[i];
+        if (frame >= 0 && frame < m_Data->frame_delays_count && frame < static_cast<int>(TextureDesc::MaximumFrames))
+            time += m_Data->frame_delays[frame];
+    }
+    return time;
+}
+
+unsigned CTexture::GetAnimTime() const
+{
+    OX_ASSERT(m_Data != 0);
+    return m_Data ? m_Data->total_time : 0;
+}
+
+void CTexture::CreateBuffer()
+{
+    if (m_Surface && !m_Surface->GetBuffer())
+        m_Surface->CreateBuffer();
+}
+
+void CTexture::LoadBuffer()
+{
+    if (m_Surface)
+        m_Surface->LoadBuffer();
+}
+
+void CTexture::DropBuffer()
+{
+    if (m_Surface)
+        m_Surface->DropBuffer();
+}
+
+void CTexture::CommitBits()
+{
+    if (m_Surface)
+        m_Surface->CommitBits();
+}
+
+uint32_t* CTexture::PixelAddress(int x, int y, int frame) const
+{
+    OX_ASSERT(m_Data);
+    if (!m_Data)
+        return nullptr;
+    OX_ASSERT(m_Data->parts_amount > 0);
+    if (!m_Surface || !m_Surface->GetBuffer() || m_Data->parts_amount == 0)
+        return nullptr;
+    if (x < 0 || y < 0 || x >= m_Data->frame_width || y >= m_Data->frame_height)
+        return nullptr;
+    const UVRect part = frame < 0 ? m_Data->Parts()[0] : GetFrameSurfaceRect(static_cast<unsigned>(frame));
+    const int left = static_cast<int>(m_Surface->GetWidth() * part.u1);
+    const int top = static_cast<int>(m_Surface->GetHeight() * part.v1);
+    const int px = left + x, py = top + y;
+    // A description that reaches past its surface reads nothing.
+    if (px < 0 || py < 0 || px >= m_Surface->GetWidth() || py >= m_Surface->GetHeight())
+        return nullptr;
+    return m_Surface->GetBuffer() + static_cast<size_t>(py) * m_Surface->GetWidth() + px;
+}
+
+uint32_t CTexture::Pixel(int x, int y, int frame) const
+{
+    const uint32_t* at = PixelAddress(x, y, frame);
+    return at ? *at : 0;
+}
+
+bool CTexture::Pixel(int x, int y, uint32_t value, int frame)
+{
+    uint32_t* at = PixelAddress(x, y, frame);
+    if (!at)
+        return false;
+    *at = value;
+    return true;
 }
 
 } // namespace ox::graphics

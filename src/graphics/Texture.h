@@ -13,6 +13,8 @@
 
 namespace ox::graphics {
 
+class CSurface;
+
 struct UVRect {
     float u1 = 0, v1 = 0, u2 = 0, v2 = 0;
     bool operator==(const UVRect& o) const { return u1 == o.u1 && v1 == o.v1 && u2 == o.u2 && v2 == o.v2; }
@@ -24,6 +26,14 @@ static_assert(sizeof(UVRect) == 16);
 struct TextureDesc {
     static constexpr unsigned MaximumFrames = 32;
     static constexpr uint32_t FlagStatic = 2;
+    enum AnimType : uint32_t {
+        AnimNone = 0,
+        AnimOnce = 1,
+        AnimLoop = 2,
+        AnimPingPong = 3,
+        AnimBackwardLoop = 4,
+        AnimBackwardPingPong = 5,
+    };
 
     misc::StringA88 id;
     uint32_t anim_type = 0;
@@ -54,6 +64,22 @@ static_assert(offsetof(TextureDesc, anim_type) == 96 && offsetof(TextureDesc, fr
               offsetof(TextureDesc, total_time) == 216 && offsetof(TextureDesc, parts_amount) == 218);
 #pragma GCC diagnostic pop
 
+// Who loads surfaces and counts video memory (the texture manager). Without one, a surface
+// that is not in video memory gets an empty device texture and nothing is counted.
+class ISurfaceManager {
+public:
+    virtual ~ISurfaceManager() = default;
+    // Makes the device texture of a surface that has none and fills it.
+    virtual bool LoadSurface(CSurface* surface) = 0;
+    virtual void AddVideoMemory(unsigned bytes) = 0;
+    virtual void RemoveVideoMemory(unsigned bytes) = 0;
+};
+
+// The application's frame number. A surface moves to the head of the MRU list at most once
+// per frame; the application counts frames from 1.
+uint32_t GetFrameNumber();
+void SetFrameNumber(uint32_t frame);
+
 class CSurface {
 public:
     enum Flags : uint8_t { FlagLoadOnDemand = 2, FlagUnloaded = 4, FlagRenderTarget = 8, FlagNearest = 16 };
@@ -77,12 +103,16 @@ public:
     uint16_t GetRefCount() const { return RefCount; }
     void AddRef() { ++RefCount; }
     void Release();
+    uint32_t GetLastUsedFrame() const { return m_LastUsedFrame; }
+    // The device texture as it is, without loading or touching (null when not in memory).
+    CDeviceTexture* PeekD3DTexture() const { return Surface; }
 
-    // The one way to the device texture: made on first use (and after a device loss).
+    // The one way to the device texture: loaded on first use (and after a drop or a device
+    // loss); the surface moves to the head of the MRU list once per frame.
     CDeviceTexture* GetD3DTexture();
-    // Makes an empty device texture of the surface's size, format and kind.
+    // Makes an empty device texture of the surface's size, format and kind, and counts it.
     bool CreateDeviceTexture();
-    // Drops the device texture and the system-memory copy.
+    // Drops the device texture and the system-memory copy, and leaves the MRU list.
     void ReleaseD3D();
     // Drops the device texture of an on-demand surface until its next use.
     void Unload();
@@ -95,12 +125,21 @@ public:
     bool LoadBits(const void* _data, size_t _data_size, unsigned _width, unsigned _height,
                   uint8_t _internal_format);
 
-    // Who loads a surface that is not in video memory (the texture manager); without one
-    // an empty device texture is made.
-    using Loader = bool (*)(CSurface& surface);
-    static void SetLoader(Loader loader);
+    static void SetManager(ISurfaceManager* manager);
+    static ISurfaceManager* GetManager();
+
+    // The MRU list of surfaces in video memory: the tail is the least recently used, and
+    // next points toward the head.
+    static CSurface* GetMRUTail() { return s_MRUTail; }
+    static CSurface* GetMRUHead() { return s_MRUHead; }
+    CSurface* GetNextInMRUList() const { return m_NextInMRUList; }
+    CSurface* GetPrevInMRUList() const { return m_PrevInMRUList; }
+    bool IsInMRUList() const { return m_PrevInMRUList || m_NextInMRUList || s_MRUHead == this; }
 
 private:
+    void MoveToMRUHead();
+    void RemoveFromMRUList();
+
     CDeviceTexture* Surface = nullptr;
     std::unique_ptr<uint32_t[]> m_Buffer;
     uint16_t Width;
@@ -109,7 +148,15 @@ private:
     uint8_t m_Flags;
     uint8_t m_InternalFormat;
     unsigned m_BytesInVMem = 0;
+    uint32_t m_LastUsedFrame = 0;
     const char* m_FileName;
+    CSurface* m_NextInMRUList = nullptr;
+    CSurface* m_PrevInMRUList = nullptr;
+    // The manager that counted m_BytesInVMem, so that the same one is paid back.
+    ISurfaceManager* m_CountedBy = nullptr;
+
+    static CSurface* s_MRUHead;
+    static CSurface* s_MRUTail;
 };
 
 class CTexture {
@@ -138,7 +185,28 @@ public:
     bool IsAnimated() const;
     unsigned EnumFrames() const;
 
+    // The frame shown at `ms` into the animation; -1 when none is (drawn as the first part).
+    int GetFrameByTime(int ms) const;
+    // The time at which frame-map entry `index` starts; 0 at or past the map's end.
+    unsigned GetTimeByFrame(unsigned index) const;
+    // The length of one pass of the animation, milliseconds.
+    unsigned GetAnimTime() const;
+
+    // The surface's pixel copy; each does nothing without a surface (CreateBuffer also
+    // nothing when a copy exists).
+    void CreateBuffer();
+    void LoadBuffer();
+    void DropBuffer();
+    void CommitBits();
+    bool SurfaceIsBuffer() const { return m_Surface && m_Surface->GetBuffer(); }
+    // A pixel of the copy, (x, y) inside the frame (-1: the first part); 0 without a
+    // surface or copy, or outside the frame.
+    uint32_t Pixel(int x, int y, int frame = -1) const;
+    // Writes a pixel of the copy; false where reading would give 0 for want of a place.
+    bool Pixel(int x, int y, uint32_t value, int frame);
+
 private:
+    uint32_t* PixelAddress(int x, int y, int frame) const;
     void Assign(CSurface* surface, const TextureDesc* data);
     void Free();
 

@@ -299,6 +299,15 @@ bool CGamePack::Access(const char* path) const
     return access(LoosePath(path).c_str(), F_OK) == 0;
 }
 
+bool CGamePack::IsLooseFile(const char* path) const
+{
+    if (!path || !*path)
+        return false;
+    if (m_HasLanguage && access(LooseOverlayPath(path).c_str(), F_OK) == 0)
+        return true;
+    return access(LoosePath(path).c_str(), F_OK) == 0;
+}
+
 const void* CGamePack::Open(const char* path, unsigned* size)
 {
     if (size)

@@ -61,6 +61,8 @@ public:
 
     // The file exists, by the same rules as Open (an empty loose file counts here).
     bool Access(const char* path) const;
+    // A loose file of this path (or its language version) lies beside the pack.
+    bool IsLooseFile(const char* path) const;
     // A read-only pointer to the whole file and its size, or null. Tried in this order:
     // the overlay in the pack, the pack, the loose overlay file, the loose file.
     // `size` may be null. Every pointer must be given back with Close.

@@ -139,6 +139,9 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
     EXPECT_EQ(log.find("[font]"), std::string::npos) << "the demo's fonts load:\n" << log;
     EXPECT_EQ(log.find("assertion failed"), std::string::npos) << log;
+    // The declared textures are known, and none of them failed to load.
+    EXPECT_NE(log.find("[texman][0]: Texture information created in"), std::string::npos) << log;
+    EXPECT_EQ(log.find("[texman][3]"), std::string::npos) << log;
     EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
     EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
 }

@@ -174,7 +174,8 @@ CDeviceTexture* RecordingBackend::CreateTexture(unsigned w, unsigned h, uint8_t 
     texture->Height = h;
     texture->Format = format;
     texture->RenderTarget = renderTarget;
-    texture->bits.assign(static_cast<size_t>(FormatBitsPerPixel(format)) * w * h / 8, 0);
+    if (allocateBits)
+        texture->bits.assign(static_cast<size_t>(FormatBitsPerPixel(format)) * w * h / 8, 0);
     ++liveTextures;
     return texture;
 }

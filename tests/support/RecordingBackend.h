@@ -45,6 +45,8 @@ public:
     DeviceResult presentResult = ox::graphics::ResultOk;
     bool queryAvailable = true;
     bool failCreateTexture = false;
+    // Off: textures keep no bits until loaded (big textures on paper, for budgets).
+    bool allocateBits = true;
     ox::graphics::ResolutionsT modes;
 
     // Counters and the device's state.

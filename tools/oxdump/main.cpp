@@ -1,7 +1,14 @@
-// oxdump: compiles game data into the binary forms the game reads in place.
+// oxdump: compiles game data into the binary forms the game reads in place, and shows
+// what a binary dump holds.
+#include "core/TextureDeclarations.h"
+#include "core/TexturesAlpha.h"
 #include "diag/Log.h"
+#include "misc/GamePack.h"
 #include "misc/StringTable.h"
+#include "misc/Unicode.h"
+#include "misc/imagelib/ImageLib.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 #include <filesystem>
@@ -9,6 +16,7 @@
 #include <sstream>
 #include <string>
 #include <unistd.h>
+#include <vector>
 
 namespace fs = std::filesystem;
 using ox::misc::CStringTable;
@@ -16,22 +24,83 @@ using ox::misc::CStringTable;
 namespace {
 
 const char* kUsage =
-    "usage: oxdump strings <strings.xml> <out>   compile the string table\n"
-    "       oxdump --help\n"
+    "usage: oxdump strings <strings.xml> <out> [--utf32]    compile the string table\n"
+    "       oxdump resources <resources.xml> <out> [--root DIR]\n"
+    "                                                    compile the texture declarations\n"
+    "       oxdump texturesalpha <folder|list> <out> [--order auto|rows|columns]\n"
+    "                                                    build the alpha-mask table\n"
+    "       oxdump show <file.bindump>                   print the records of a dump\n"
+    "       oxdump COMMAND --help                        details of one command\n";
+
+const char* kStringsHelp =
+    "usage: oxdump strings <strings.xml> <out> [--utf32]\n"
     "\n"
-    "strings: reads elements with an id attribute and a UTF-8 text, e.g.\n"
+    "Reads elements with an id attribute and a UTF-8 text, e.g.\n"
     "  <strings><s id=\"12\">Open the door</s></strings>\n"
     "and writes the 16-bit table the game reads in place. Name the output\n"
     "properties/strings.bindump (or properties/strings.xml.bin_utf16le); with --utf32\n"
     "it writes the 32-bit form instead.\n";
 
-int UsageError(const char* message)
+const char* kResourcesHelp =
+    "usage: oxdump resources <resources.xml> <out> [--root DIR]\n"
+    "\n"
+    "Compiles the texture declarations into properties/resources.bindump, the block the\n"
+    "game uses in place: surfaces sorted by path, groups, the image table sorted by id\n"
+    "and one description per image. Image sizes the XML leaves out are read from the\n"
+    "image files, found under the game folder DIR (by default the folder that holds\n"
+    "properties/, or else the XML's own folder), inside its game.pack or loose.\n";
+
+const char* kTexturesAlphaHelp =
+    "usage: oxdump texturesalpha <folder|list> <out> [--order auto|rows|columns]\n"
+    "\n"
+    "Builds properties/texturesalpha.bindump, one run-length mask per image (a pixel is\n"
+    "solid when its alpha is not 0), for the ids the game asks with. From a folder: every\n"
+    ".png and .jpg in it and below, the id being the file name without extension. From a\n"
+    "list file: one image per line, \"ID=PATH\" or \"PATH\" (id as above), paths relative to\n"
+    "the list; empty lines and lines starting with # are skipped. --order picks the scan\n"
+    "order; auto (default) takes whichever gives fewer runs.\n";
+
+const char* kShowHelp =
+    "usage: oxdump show <file.bindump>\n"
+    "\n"
+    "Checks a binary dump as the game would and prints its records: texture declarations\n"
+    "(resources.bindump), alpha masks (texturesalpha.bindump) and string tables\n"
+    "(strings.bindump, strings.xml.bin_utf16le, strings.xml.bin_utf32le).\n";
+
+int UsageError(const std::string& message, const char* usage = kUsage)
 {
-    fprintf(stderr, "oxdump: %s\n%s", message, kUsage);
+    fprintf(stderr, "oxdump: %s\n%s", message.c_str(), usage);
     return 2;
 }
 
-bool ReadWhole(const char* path, std::string& out)
+// Log lines of the library go to a temporary file; the warnings and errors among them are
+// shown on standard error, since they say what was wrong with the input.
+class LogToStderr {
+public:
+    LogToStderr() : m_Path((fs::temp_directory_path() / ("oxdump-" + std::to_string(getpid()) + ".log")).string())
+    {
+        ox::diag::Log::Instance().SetFile(m_Path);
+    }
+    ~LogToStderr()
+    {
+        ox::diag::Log::Instance().Close();
+        std::ifstream in(m_Path);
+        for (std::string line; std::getline(in, line);) {
+            size_t at = line.find("][3]: ");
+            if (at == std::string::npos)
+                at = line.find("][2]: ");
+            if (at != std::string::npos)
+                fprintf(stderr, "  %s\n", line.substr(at + 6).c_str());
+        }
+        std::error_code ignored;
+        fs::remove(m_Path, ignored);
+    }
+
+private:
+    std::string m_Path;
+};
+
+bool ReadWhole(const std::string& path, std::string& out)
 {
     std::ifstream in(path, std::ios::binary);
     if (!in)
@@ -43,9 +112,9 @@ bool ReadWhole(const char* path, std::string& out)
 }
 
 // Writes beside the target, then renames: a failed run leaves the old file.
-bool WriteAtomically(const char* path, const std::vector<uint8_t>& bytes)
+bool WriteAtomically(const std::string& path, const std::vector<uint8_t>& bytes)
 {
-    std::string temporary = std::string(path) + ".tmp";
+    std::string temporary = path + ".tmp";
     {
         std::ofstream out(temporary, std::ios::binary | std::ios::trunc);
         if (!out)
@@ -70,7 +139,7 @@ int Strings(int argc, char** argv)
             files.push_back(argv[i]);
     }
     if (files.size() != 2)
-        return UsageError("strings needs <strings.xml> <out>");
+        return UsageError("strings needs <strings.xml> <out>", kStringsHelp);
     std::string xml;
     if (!ReadWhole(files[0], xml)) {
         fprintf(stderr, "oxdump: cannot read %s\n", files[0]);
@@ -108,22 +177,364 @@ int Strings(int argc, char** argv)
     return 0;
 }
 
+
+// "--name value" options after the command; the rest are positional.
+bool SplitOptions(int argc, char** argv, std::vector<std::string>& positional,
+                  std::vector<std::pair<std::string, std::string>>& options, const std::vector<std::string>& known,
+                  std::string& error)
+{
+    for (int i = 2; i < argc; ++i) {
+        std::string arg = argv[i];
+        if (arg.rfind("--", 0) != 0) {
+            positional.push_back(arg);
+            continue;
+        }
+        if (std::find(known.begin(), known.end(), arg) == known.end() || i + 1 >= argc) {
+            error = "bad option " + arg;
+            return false;
+        }
+        options.emplace_back(arg, argv[++i]);
+    }
+    return true;
+}
+
+int Resources(int argc, char** argv)
+{
+    std::vector<std::string> files;
+    std::vector<std::pair<std::string, std::string>> options;
+    std::string error;
+    if (!SplitOptions(argc, argv, files, options, {"--root"}, error))
+        return UsageError(error, kResourcesHelp);
+    if (files.size() != 2)
+        return UsageError("resources needs <resources.xml> <out>", kResourcesHelp);
+    std::string xml;
+    if (!ReadWhole(files[0], xml)) {
+        fprintf(stderr, "oxdump: cannot read %s\n", files[0].c_str());
+        return 1;
+    }
+    fs::path root = fs::absolute(files[0]).parent_path();
+    if (root.filename() == "properties")
+        root = root.parent_path();
+    for (const auto& [name, value] : options)
+        if (name == "--root")
+            root = value;
+    ox::misc::GamePackConfig config;
+    config.folder = root.string();
+    config.language = "";
+    ox::misc::CGamePack pack(config);
+    ox::core::CTextureDeclarationsLoader loader(&pack);
+    std::vector<uint8_t> bulk;
+    if (!loader.ConvertXml(xml.data(), xml.size(), files[0].c_str(), bulk)) {
+        fprintf(stderr, "oxdump: %s is not valid\n", files[0].c_str());
+        return 1;
+    }
+    if (!WriteAtomically(files[1], bulk)) {
+        fprintf(stderr, "oxdump: cannot write %s\n", files[1].c_str());
+        return 1;
+    }
+    const auto* header = reinterpret_cast<const ox::core::CTextureDeclarationsLoader::Header*>(bulk.data());
+    printf("%s: %u surfaces, %u groups, %u images, %zu bytes\n", files[1].c_str(), header->surfaces_amount,
+           header->groups_amount, header->images_amount, bulk.size());
+    return 0;
+}
+
+bool IsImageFile(const fs::path& path)
+{
+    std::string extension = path.extension().string();
+    std::transform(extension.begin(), extension.end(), extension.begin(), ::tolower);
+    return extension == ".png" || extension == ".jpg";
+}
+
+bool DecodeFile(const std::string& path, ox::misc::imagelib::Image& image)
+{
+    std::unique_ptr<ox::misc::imagelib::CImageDecoder> decoder = ox::misc::imagelib::MakeDecoder(path.c_str());
+    std::string data;
+    if (!decoder || !ReadWhole(path, data)) {
+        fprintf(stderr, "oxdump: cannot read the image %s\n", path.c_str());
+        return false;
+    }
+    decoder->SetName(path);
+    if (!decoder->Decode(data.data(), data.size(), image)) {
+        fprintf(stderr, "oxdump: %s is not a valid image\n", path.c_str());
+        return false;
+    }
+    return true;
+}
+
+int TexturesAlpha(int argc, char** argv)
+{
+    std::vector<std::string> files;
+    std::vector<std::pair<std::string, std::string>> options;
+    std::string error;
+    if (!SplitOptions(argc, argv, files, options, {"--order"}, error))
+        return UsageError(error, kTexturesAlphaHelp);
+    if (files.size() != 2)
+        return UsageError("texturesalpha needs <folder|list> <out>", kTexturesAlphaHelp);
+    int order = 0;
+    for (const auto& [name, value] : options) {
+        order = value == "auto" ? 0 : value == "rows" ? 1 : value == "columns" ? 2 : -1;
+        if (order < 0)
+            return UsageError("bad order " + value, kTexturesAlphaHelp);
+    }
+    // (id, path) of every image, sorted by path so that the run is the same each time.
+    std::vector<std::pair<std::string, std::string>> images;
+    std::error_code fsError;
+    if (fs::is_directory(files[0], fsError)) {
+        for (const auto& entry : fs::recursive_directory_iterator(files[0], fsError))
+            if (entry.is_regular_file() && IsImageFile(entry.path()))
+                images.emplace_back(entry.path().stem().string(), entry.path().string());
+        std::sort(images.begin(), images.end(), [](const auto& a, const auto& b) { return a.second < b.second; });
+    } else {
+        std::string list;
+        if (!ReadWhole(files[0], list)) {
+            fprintf(stderr, "oxdump: cannot read %s\n", files[0].c_str());
+            return 1;
+        }
+        const fs::path base = fs::path(files[0]).parent_path();
+        std::istringstream lines(list);
+        for (std::string line; std::getline(lines, line);) {
+            while (!line.empty() && (line.back() == '\r' || line.back() == ' ' || line.back() == '\t'))
+                line.pop_back();
+            if (line.empty() || line[0] == '#')
+                continue;
+            size_t equals = line.find('=');
+            std::string path = equals == std::string::npos ? line : line.substr(equals + 1);
+            std::string id = equals == std::string::npos ? fs::path(path).stem().string() : line.substr(0, equals);
+            images.emplace_back(id, (base / path).string());
+        }
+    }
+    if (images.empty()) {
+        fprintf(stderr, "oxdump: no images in %s\n", files[0].c_str());
+        return 1;
+    }
+    std::vector<ox::core::AlphaMaskSource> sources;
+    for (const auto& [id, path] : images) {
+        ox::misc::imagelib::Image image;
+        if (!DecodeFile(path, image))
+            return 1;
+        ox::core::AlphaMaskSource source;
+        source.id = id;
+        source.width = image.width;
+        source.height = image.height;
+        source.pixels = std::move(image.pixels);
+        source.order = order;
+        sources.push_back(std::move(source));
+    }
+    std::vector<uint8_t> table;
+    if (!ox::core::BuildTexturesAlpha(sources, table, &error)) {
+        fprintf(stderr, "oxdump: %s\n", error.c_str());
+        return 1;
+    }
+    if (!WriteAtomically(files[1], table)) {
+        fprintf(stderr, "oxdump: cannot write %s\n", files[1].c_str());
+        return 1;
+    }
+    printf("%s: %zu masks, %zu bytes\n", files[1].c_str(), sources.size(), table.size());
+    return 0;
+}
+
+const char* AnimName(uint32_t type)
+{
+    static const char* names[] = {"none", "once", "loop", "pingpong", "backward loop", "backward pingpong"};
+    return type < 6 ? names[type] : "?";
+}
+
+void ShowResources(const ox::core::CTextureDeclarationsLoader& loader)
+{
+    using Loader = ox::core::CTextureDeclarationsLoader;
+    const Loader::Header* header = loader.Data();
+    printf("texture declarations, revision %u: %u surfaces, %u groups, %u images\n", header->magic >> 24,
+           header->surfaces_amount, header->groups_amount, header->images_amount);
+    const Loader::SurfaceRecord* surfaces = loader.Surfaces();
+    for (uint32_t i = 0; i < loader.SurfacesAmount(); ++i)
+        printf("surface %s %ux%u format %u flags %u\n", surfaces[i].path.c_str(), surfaces[i].width,
+               surfaces[i].height, surfaces[i].internal_format, surfaces[i].flags);
+    const Loader::GroupRecord* groups = loader.Groups();
+    for (uint32_t i = 0; i < loader.GroupsAmount(); ++i) {
+        const Loader::GroupRecord* parent = loader.Group(groups[i].parent);
+        printf("group %s flags %u parent %s\n", groups[i].id.c_str(), groups[i].flags,
+               parent ? parent->id.c_str() : "-");
+    }
+    const Loader::ImageEntry* images = loader.Images();
+    for (uint32_t i = 0; i < loader.ImagesAmount(); ++i) {
+        const Loader::TextureDesc* desc = loader.Desc(images[i]);
+        const Loader::GroupRecord* group = loader.Group(images[i].group);
+        printf("image %s surface %s group %s frame %ux%u cols %u rows %u anim %s flags %u total %ums\n",
+               images[i].id.c_str(), surfaces[loader.SurfaceIndex(*desc)].path.c_str(),
+               group ? group->id.c_str() : "-", desc->frame_width, desc->frame_height, desc->cols, desc->rows,
+               AnimName(desc->anim_type), desc->flags, desc->total_time);
+        printf("  delays");
+        for (unsigned d = 0; d < desc->frame_delays_count; ++d)
+            printf(" %u", desc->frame_delays[d]);
+        printf("\n  frame map");
+        for (unsigned m = 0; m < desc->frame_map_length; ++m)
+            printf(" %d", desc->frame_map[m]);
+        printf("\n");
+        for (unsigned p = 0; p < desc->parts_amount; ++p) {
+            const ox::graphics::UVRect& uv = desc->Parts()[p];
+            printf("  part %g %g %g %g\n", uv.u1, uv.v1, uv.u2, uv.v2);
+        }
+    }
+}
+
+void ShowAlpha(const uint8_t* data, const ox::core::CTexturesAlpha& store)
+{
+    printf("alpha masks, revision 1: %u masks\n", store.Count());
+    const auto* records = reinterpret_cast<const ox::core::TextureAlphaDesc*>(data + sizeof(ox::core::TexturesAlphaHeader));
+    for (uint32_t r = 0; r < store.Count(); ++r) {
+        const ox::core::TextureAlphaDesc& d = records[r];
+        if (d.uniform)
+            printf("mask %s %ux%u uniform %s\n", d.id.c_str(), d.width, d.height, d.uniform_value ? "solid" : "clear");
+        else
+            printf("mask %s %ux%u %u runs by %s\n", d.id.c_str(), d.width, d.height, d.size / 2,
+                   d.order == 1 ? "rows" : "columns");
+    }
+}
+
+uint32_t ReadU32(const uint8_t* p)
+{
+    uint32_t value;
+    memcpy(&value, p, 4);
+    return value;
+}
+
+// The 32-bit string table is checked here: it has no reader in the game.
+bool ShowStrings32(const uint8_t* data, size_t size, const char* name)
+{
+    const uint32_t count = ReadU32(data + 4);
+    if (count > (size - 8) / 8) {
+        fprintf(stderr, "oxdump: %s: %u entries do not fit in %zu bytes\n", name, count, size);
+        return false;
+    }
+    printf("strings, 32-bit: %u\n", count);
+    for (uint32_t i = 0; i < count; ++i) {
+        const int id = static_cast<int>(ReadU32(data + 8 + 8 * i));
+        const uint32_t offset = ReadU32(data + 8 + 8 * i + 4);
+        std::u32string text;
+        size_t at = offset;
+        bool terminated = false;
+        for (; at + 4 <= size; at += 4) {
+            const uint32_t c = ReadU32(data + at);
+            if (c == 0) {
+                terminated = true;
+                break;
+            }
+            text.push_back(c);
+        }
+        if (offset < 8 + 8ull * count || !terminated) {
+            fprintf(stderr, "oxdump: %s: entry %u points outside the table\n", name, i);
+            return false;
+        }
+        ox::wstring wide;
+        for (char32_t c : text) {
+            if (c >= 0x10000) {
+                wide.push_back(static_cast<char16_t>(0xD800 + ((c - 0x10000) >> 10)));
+                wide.push_back(static_cast<char16_t>(0xDC00 + ((c - 0x10000) & 0x3FF)));
+            } else {
+                wide.push_back(static_cast<char16_t>(c));
+            }
+        }
+        printf("%d: %s\n", id, ox::misc::WideToUtf8(wide).c_str());
+    }
+    return true;
+}
+
+void ShowStrings16(const uint8_t* data, uint32_t count)
+{
+    printf("strings, 16-bit: %u\n", count);
+    for (uint32_t i = 0; i < count; ++i) {
+        const int id = static_cast<int>(ReadU32(data + 8 + 8 * i));
+        const auto* text = reinterpret_cast<const char16_t*>(data + ReadU32(data + 8 + 8 * i + 4));
+        printf("%d: %s\n", id, ox::misc::WideToUtf8(ox::wstring(text)).c_str());
+    }
+}
+
+int Show(int argc, char** argv)
+{
+    if (argc != 3)
+        return UsageError("show needs one file", kShowHelp);
+    const std::string path = argv[2];
+    std::string bytes;
+    if (!ReadWhole(path, bytes)) {
+        fprintf(stderr, "oxdump: cannot read %s\n", path.c_str());
+        return 1;
+    }
+    // The dumps are read in place as records: keep them aligned as a mapping would be.
+    std::vector<uint32_t> words((bytes.size() + 3) / 4 + 1, 0);
+    memcpy(words.data(), bytes.data(), bytes.size());
+    const auto* data = reinterpret_cast<const uint8_t*>(words.data());
+    const size_t size = bytes.size();
+    if (size < 8) {
+        fprintf(stderr, "oxdump: %s is too short for any dump\n", path.c_str());
+        return 1;
+    }
+    const uint32_t magic = ReadU32(data);
+    bool ok = false;
+    if ((magic & 0xFFFFFF) == (ox::core::CTextureDeclarationsLoader::Magic & 0xFFFFFF)) {
+        ox::core::CTextureDeclarationsLoader loader;
+        if ((ok = loader.LoadFromMemory(data, size, path.c_str())))
+            ShowResources(loader);
+    } else if ((magic & 0xFFFFFF) == (ox::core::g_Magick & 0xFFFFFF)) {
+        ox::core::CTexturesAlpha store;
+        if ((ok = store.LoadFromMemory(data, size, path.c_str())))
+            ShowAlpha(data, store);
+    } else if (memcmp(data, "S16\x01", 4) == 0 || memcmp(data, "S16L", 4) == 0) {
+        CStringTable table;
+        if ((ok = table.UseTable(data, size, path.c_str())))
+            ShowStrings16(data, table.GetCount());
+    } else if (memcmp(data, "S32L", 4) == 0) {
+        ok = ShowStrings32(data, size, path.c_str());
+    } else {
+        fprintf(stderr, "oxdump: %s: unknown kind of dump (first word 0x%08X)\n", path.c_str(), magic);
+        return 1;
+    }
+    if (!ok) {
+        fprintf(stderr, "oxdump: %s is not valid\n", path.c_str());
+        return 1;
+    }
+    return 0;
+}
+
+bool WantsHelp(int argc, char** argv)
+{
+    for (int i = 2; i < argc; ++i)
+        if (strcmp(argv[i], "--help") == 0 || strcmp(argv[i], "-h") == 0)
+            return true;
+    return false;
+}
+
 } // namespace
 
 int main(int argc, char** argv)
 {
     if (argc < 2)
         return UsageError("no command");
-    if (strcmp(argv[1], "--help") == 0 || strcmp(argv[1], "-h") == 0) {
+    const std::string command = argv[1];
+    if (command == "--help" || command == "-h") {
         fputs(kUsage, stdout);
         return 0;
     }
-    if (strcmp(argv[1], "strings") == 0) {
-        if (argc == 3 && strcmp(argv[2], "--help") == 0) {
-            fputs(kUsage, stdout);
+    struct Command {
+        const char* name;
+        int (*run)(int, char**);
+        const char* help;
+    } commands[] = {
+        {"strings", Strings, kStringsHelp},
+        {"resources", Resources, kResourcesHelp},
+        {"texturesalpha", TexturesAlpha, kTexturesAlphaHelp},
+        {"show", Show, kShowHelp},
+    };
+    for (const Command& c : commands) {
+        if (command != c.name)
+            continue;
+        if (WantsHelp(argc, argv)) {
+            fputs(c.help, stdout);
             return 0;
         }
-        return Strings(argc, argv);
+        if (c.run == Strings)
+            return c.run(argc, argv);  // shows its own parse problems
+        LogToStderr log;
+        return c.run(argc, argv);
     }
-    return UsageError((std::string("unknown command ") + argv[1]).c_str());
+    return UsageError("unknown command " + command);
 }

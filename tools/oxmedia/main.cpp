@@ -36,7 +36,8 @@ const char* kPngHelp =
     "\n"
     "Writes a generated image. --size defaults to 64x64, --pattern to checker.\n"
     "Patterns: checker, gradient, circle (opaque disc on transparent), stripes\n"
-    "(transparent and opaque columns), noise (random channels, the same every time).\n"
+    "(transparent and opaque columns), noise (random channels, the same every time),\n"
+    "spinner (a sprite sheet: square cells side by side, a dot turning round a ring).\n"
     "Layouts: rgba (default), rgb, palette (with a transparency table; up to 256\n"
     "colours, 1 to 8 bits as needed), grey, greyalpha. --depth: 8 (default) or 16;\n"
     "grey also takes 1, 2 or 4. --interlace writes Adam7 interlacing.\n";

@@ -4,6 +4,7 @@
 #include "misc/imagelib/PvrContainer.h"
 
 #include <algorithm>
+#include <cmath>
 #include <csetjmp>
 #include <cstring>
 #include <lzo/lzo1x.h>
@@ -451,6 +452,20 @@ bool MakePattern(const std::string& name, uint32_t width, uint32_t height, std::
                 p = dx * dx + dy * dy <= radius * radius ? 0xFFE08020u : 0x00000000u;
             } else if (name == "stripes") {
                 p = x % 8 < 3 ? 0x00FFFFFFu : 0xFF3070B0u;
+            } else if (name == "spinner") {
+                // Square cells side by side; in cell i a dot stands at i / cells of a turn.
+                const uint32_t side = std::max<uint32_t>(height, 1), cells = std::max<uint32_t>(width / side, 1);
+                const uint32_t cell = std::min(x / side, cells - 1);
+                const double angle = 6.283185307179586 * cell / cells;
+                const double cx = side / 2.0 + side * 0.3 * std::cos(angle), cy = side / 2.0 + side * 0.3 * std::sin(angle);
+                const double dx = (x - cell * side) + 0.5 - cx, dy = y + 0.5 - cy, r = side * 0.15;
+                const double ring = std::hypot((x - cell * side) + 0.5 - side / 2.0, y + 0.5 - side / 2.0);
+                if (dx * dx + dy * dy <= r * r)
+                    p = 0xFFF0D040u;
+                else if (std::fabs(ring - side * 0.3) < side * 0.04)
+                    p = 0x80A0A0C0u;
+                else
+                    p = 0x00000000u;
             } else if (name == "noise") {
                 seed = seed * 1664525u + 1013904223u;
                 p = seed ^ (seed >> 15);
@@ -463,6 +478,6 @@ bool MakePattern(const std::string& name, uint32_t width, uint32_t height, std::
     return true;
 }
 
-const char* PatternNames() { return "checker, gradient, circle, stripes, noise"; }
+const char* PatternNames() { return "checker, gradient, circle, stripes, noise, spinner"; }
 
 } // namespace ox::misc::imagelib

@@ -50,7 +50,9 @@ std::string PvrFormatNames();
 // Fills `pixels` with a named pattern: "checker" (opaque 8-pixel cells), "gradient"
 // (opaque red and green ramps), "circle" (an opaque disc on transparent pixels), "stripes"
 // (vertical stripes of alpha 0 and 255, 3 and 5 pixels wide), "noise" (every channel
-// pseudo-random, the same each time). False for another name.
+// pseudo-random, the same each time), "spinner" (square cells side by side, height by
+// height, each with a dot one step further round a faint ring: a sprite sheet). False for
+// another name.
 bool MakePattern(const std::string& name, uint32_t width, uint32_t height, std::vector<uint32_t>& pixels);
 const char* PatternNames();
 

@@ -1,0 +1,27 @@
+#!/bin/sh
+# Regenerates the demo game's textures and texture dumps with the content tools; the same
+# tools give the same bytes, so the files in this folder can be checked against a run.
+#
+#   games/demo/make-textures.sh [TOOLS_DIR [OUT_DIR]]
+#
+# TOOLS_DIR holds oxmedia and oxdump (default: build/tools of the repository); OUT_DIR is
+# where textures/ and properties/ are written (default: this folder).
+set -eu
+here=$(cd "$(dirname "$0")" && pwd)
+tools=${1:-$here/../../build/tools}
+out=${2:-$here}
+mkdir -p "$out/textures" "$out/properties"
+scratch=$(mktemp -d)
+trap 'rm -rf "$scratch"' EXIT
+
+"$tools/oxmedia" png "$out/textures/demo_spinner.png" --size 384x48 --pattern spinner
+"$tools/oxmedia" png "$out/textures/demo_disc.png" --size 96x96 --pattern circle
+"$tools/oxmedia" png "$out/textures/demo_frame.png" --size 48x48 --pattern checker
+"$tools/oxmedia" png "$scratch/stone.png" --size 64x64 --pattern gradient
+"$tools/oxmedia" pvr "$scratch/stone.png" "$out/textures/demo_stone.pvr" --format dxt1
+
+# The declarations read image sizes from the files, so they come after the images. The fonts'
+# glyph images are declared too; they are made by oxfont (see README.md), not here.
+[ "$out" = "$here" ] || cp -r "$here/fonts" "$out/"
+"$tools/oxdump" resources "$here/properties/resources.xml" "$out/properties/resources.bindump" --root "$out" >/dev/null
+"$tools/oxdump" texturesalpha "$out/textures" "$out/properties/texturesalpha.bindump" >/dev/null

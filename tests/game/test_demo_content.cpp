@@ -1,0 +1,24 @@
+// The demo game's generated textures and dumps are what the documented command makes.
+#include "support/TestSupport.h"
+
+#include <cstdlib>
+#include <sys/wait.h>
+
+namespace fs = std::filesystem;
+
+TEST(DemoContent, TexturesAndDumpsRegenerateByteForByte)
+{
+    oxtest::TempDir out;
+    const std::string command = std::string("sh '") + OX_DEMO_GAME + "/make-textures.sh' '" + OX_TOOLS_DIR + "' '" +
+                                out.Path().string() + "' >'" + (out / "log.txt").string() + "' 2>&1";
+    const int status = system(command.c_str());
+    ASSERT_EQ(WEXITSTATUS(status), 0) << oxtest::ReadFile(out / "log.txt");
+    const char* files[] = {"textures/demo_spinner.png", "textures/demo_disc.png", "textures/demo_frame.png",
+                           "textures/demo_stone.pvr", "properties/resources.bindump",
+                           "properties/texturesalpha.bindump"};
+    for (const char* file : files) {
+        ASSERT_TRUE(fs::exists(out / file)) << file;
+        EXPECT_TRUE(oxtest::ReadFile(out / file) == oxtest::ReadFile(fs::path(OX_DEMO_GAME) / file))
+            << file << " differs from what games/demo/make-textures.sh makes";
+    }
+}
