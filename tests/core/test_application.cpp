@@ -69,6 +69,9 @@ struct AppFixture : ::testing::Test {
 
     void SetUp() override
     {
+        // The time manager is process-wide: start from a running clock whatever ran before.
+        while (GetTimeManager().GetRoot()->IsPaused())
+            GetTimeManager().Pause(false);
         dir.Write("game.xml", "<?xml version=\"1.0\"?><settings product=\"Quest\" version=\"123\"/>");
         app = std::make_unique<CApplication>();
         app->SetSystemIntegration(&adapter);
