@@ -2,6 +2,7 @@
 // what a binary dump holds.
 #include "core/TextureDeclarations.h"
 #include "core/TexturesAlpha.h"
+#include "common/LogToStderr.h"
 #include "diag/Log.h"
 #include "misc/GamePack.h"
 #include "misc/StringTable.h"
@@ -72,33 +73,6 @@ int UsageError(const std::string& message, const char* usage = kUsage)
     fprintf(stderr, "oxdump: %s\n%s", message.c_str(), usage);
     return 2;
 }
-
-// Log lines of the library go to a temporary file; the warnings and errors among them are
-// shown on standard error, since they say what was wrong with the input.
-class LogToStderr {
-public:
-    LogToStderr() : m_Path((fs::temp_directory_path() / ("oxdump-" + std::to_string(getpid()) + ".log")).string())
-    {
-        ox::diag::Log::Instance().SetFile(m_Path);
-    }
-    ~LogToStderr()
-    {
-        ox::diag::Log::Instance().Close();
-        std::ifstream in(m_Path);
-        for (std::string line; std::getline(in, line);) {
-            size_t at = line.find("][3]: ");
-            if (at == std::string::npos)
-                at = line.find("][2]: ");
-            if (at != std::string::npos)
-                fprintf(stderr, "  %s\n", line.substr(at + 6).c_str());
-        }
-        std::error_code ignored;
-        fs::remove(m_Path, ignored);
-    }
-
-private:
-    std::string m_Path;
-};
 
 bool ReadWhole(const std::string& path, std::string& out)
 {
@@ -533,7 +507,7 @@ int main(int argc, char** argv)
         }
         if (c.run == Strings)
             return c.run(argc, argv);  // shows its own parse problems
-        LogToStderr log;
+        oxtools::LogToStderr log("oxdump");
         return c.run(argc, argv);
     }
     return UsageError("unknown command " + command);

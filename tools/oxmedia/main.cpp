@@ -2,6 +2,7 @@
 // containers, builds the alpha-mask table, and describes media files, all with the code
 // the game reads them with.
 #include "core/TexturesAlpha.h"
+#include "common/LogToStderr.h"
 #include "diag/Log.h"
 #include "misc/imagelib/ImageLib.h"
 #include "misc/imagelib/MediaWriter.h"
@@ -68,33 +69,6 @@ const char* kInfoHelp =
     "\n"
     "Prints the size of PNG and JPEG images, the size and surface format of .pvr and\n"
     ".pvrlzo containers, and the masks of an alpha-mask table.\n";
-
-// Log lines of the library go to a temporary file; the warnings and errors among them
-// are shown on standard error, since they say why a file was refused.
-class LogToStderr {
-public:
-    LogToStderr() : m_Path((fs::temp_directory_path() / ("oxmedia-" + std::to_string(getpid()) + ".log")).string())
-    {
-        ox::diag::Log::Instance().SetFile(m_Path);
-    }
-    ~LogToStderr()
-    {
-        ox::diag::Log::Instance().Close();
-        std::ifstream in(m_Path);
-        for (std::string line; std::getline(in, line);) {
-            size_t at = line.find("][3]: ");
-            if (at == std::string::npos)
-                at = line.find("][2]: ");
-            if (at != std::string::npos)
-                fprintf(stderr, "  %s\n", line.substr(at + 6).c_str());
-        }
-        std::error_code ignored;
-        fs::remove(m_Path, ignored);
-    }
-
-private:
-    std::string m_Path;
-};
 
 int UsageError(const std::string& message, const char* usage = kUsage)
 {
@@ -470,7 +444,7 @@ int main(int argc, char** argv)
                 fputs(PvrFormatNames().c_str(), stdout);
             return 0;
         }
-        LogToStderr log;
+        oxtools::LogToStderr log("oxmedia");
         return c.run(argc, argv);
     }
     return UsageError("unknown command " + command);
