@@ -119,24 +119,11 @@ int Strings(int argc, char** argv)
         fprintf(stderr, "oxdump: cannot read %s\n", files[0]);
         return 1;
     }
-    // Parse problems go to the log; show them on standard error for the maker.
-    std::string logPath = (fs::temp_directory_path() / ("oxdump-" + std::to_string(getpid()) + ".log")).string();
-    ox::diag::Log::Instance().SetFile(logPath);
     std::vector<std::pair<int, ox::wstring>> texts;
-    bool ok = CStringTable::ParseXml(xml.data(), xml.size(), files[0], texts);
-    ox::diag::Log::Instance().Close();
-    if (!ok) {
-        std::string log;
-        ReadWhole(logPath.c_str(), log);
+    if (!CStringTable::ParseXml(xml.data(), xml.size(), files[0], texts)) {
         fprintf(stderr, "oxdump: %s is not valid\n", files[0]);
-        std::istringstream lines(log);
-        for (std::string line; std::getline(lines, line);)
-            if (line.find("][3]: ") != std::string::npos)
-                fprintf(stderr, "  %s\n", line.substr(line.find("][3]: ") + 6).c_str());
-        fs::remove(logPath);
         return 1;
     }
-    fs::remove(logPath);
     std::vector<uint8_t> bytes = CStringTable::BuildBinary16(texts, "S16\x01");
     if (utf32) {
         CStringTable table;
@@ -505,8 +492,6 @@ int main(int argc, char** argv)
             fputs(c.help, stdout);
             return 0;
         }
-        if (c.run == Strings)
-            return c.run(argc, argv);  // shows its own parse problems
         oxtools::LogToStderr log("oxdump");
         return c.run(argc, argv);
     }
