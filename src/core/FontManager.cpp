@@ -120,17 +120,10 @@ unsigned CFontManager::SaveBindumps() const
         if (!info.owned)
             continue;
         const std::string dump = misc::sys::NativePath(path + ".bindump");
-        FILE* file = fopen(dump.c_str(), "wb");
-        if (!file) {
-            OX_LOG("font", diag::LogError, "cannot write '%s'", dump.c_str());
-            continue;
-        }
-        const size_t bytes = info.block.size() * sizeof(uint32_t);
-        const bool ok = fwrite(info.block.data(), 1, bytes, file) == bytes;
-        if (fclose(file) != 0 || !ok)
-            OX_LOG("font", diag::LogError, "cannot write '%s'", dump.c_str());
-        else
+        if (misc::sys::WriteFileAtomically(dump, info.block.data(), info.block.size() * sizeof(uint32_t)))
             ++written;
+        else
+            OX_LOG("font", diag::LogError, "cannot write '%s'", dump.c_str());
     }
     return written;
 }

@@ -1,5 +1,7 @@
 #include "misc/PackWriter.h"
 
+#include "misc/sys/Path.h"
+
 #include "misc/GamePack.h"
 
 #include <algorithm>
@@ -197,21 +199,21 @@ bool CPackWriter::Build(std::string& image)
 
 bool CPackWriter::Write(const fs::path& packFile)
 {
-    fs::path temporary = packFile;
-    temporary += ".tmp" + std::to_string(getpid());
-    FILE* out = fopen(temporary.c_str(), "wb");
-    if (!out)
-        return Fail(temporary.string() + ": cannot be created");
-    bool ok = Emit([out](const void* data, size_t size) { return fwrite(data, 1, size, out) == size; });
-    if (ok && (fflush(out) != 0 || fsync(fileno(out)) != 0))
-        ok = Fail(packFile.string() + ": cannot be written");
-    if (fclose(out) != 0 && ok)
-        ok = Fail(packFile.string() + ": cannot be written");
-    if (ok && rename(temporary.c_str(), packFile.c_str()) != 0)
-        ok = Fail(packFile.string() + ": cannot be replaced");
-    if (!ok)
-        remove(temporary.c_str());
-    return ok;
+    m_Error.clear();
+    switch (sys::WriteFileAtomically(packFile.string(), [this](FILE* out) {
+        return Emit([out](const void* data, size_t size) { return fwrite(data, 1, size, out) == size; });
+    })) {
+    case sys::AtomicWrite::Done:
+        return true;
+    case sys::AtomicWrite::CannotCreate:
+        return Fail(packFile.string() + ": cannot be created");
+    case sys::AtomicWrite::CannotWrite:
+        // Emit names what went wrong itself, unless the disk refused the data.
+        return m_Error.empty() ? Fail(packFile.string() + ": cannot be written") : false;
+    case sys::AtomicWrite::CannotReplace:
+        return Fail(packFile.string() + ": cannot be replaced");
+    }
+    return false;
 }
 
 } // namespace ox::misc

@@ -6,6 +6,7 @@
 #include "misc/GamePack.h"
 #include "misc/Unicode.h"
 #include "misc/XmlParser.h"
+#include "misc/sys/Path.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -306,15 +307,10 @@ bool CStringTable::SaveBinaryDumps() const
 {
     if (!m_Table)
         return false;
-    if (FILE* f = fopen("strings.xml.bin_utf16le", "wb")) {
-        fwrite(m_Table, 1, m_Size, f);
-        fclose(f);
-    }
+    // A file that cannot be written is passed over.
+    sys::WriteFileAtomically("strings.xml.bin_utf16le", m_Table, m_Size);
     std::vector<uint8_t> wide = BuildBinary32();
-    if (FILE* f = fopen("strings.xml.bin_utf32le", "wb")) {
-        fwrite(wide.data(), 1, wide.size(), f);
-        fclose(f);
-    }
+    sys::WriteFileAtomically("strings.xml.bin_utf32le", wide.data(), wide.size());
     return true;
 }
 

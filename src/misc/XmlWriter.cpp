@@ -1,5 +1,7 @@
 #include "misc/XmlWriter.h"
 
+#include "misc/sys/Path.h"
+
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "misc/Unicode.h"
@@ -84,53 +86,26 @@ bool CXmlWriter::GetBuffer(void** data, unsigned* size) const
     return true;
 }
 
-namespace {
-
-// Makes a finished rename durable; a folder that cannot be opened is left as it is.
-void SyncFolderOf(const std::string& path)
-{
-    size_t slash = path.rfind('/');
-    std::string folder = slash == std::string::npos ? "." : (slash == 0 ? "/" : path.substr(0, slash));
-    int fd = open(folder.c_str(), O_RDONLY | O_DIRECTORY);
-    if (fd >= 0) {
-        fsync(fd);
-        close(fd);
-    }
-}
-
-} // namespace
-
 void CXmlWriter::SaveToFile(const wstring& path) const
 {
     if (m_Chunks.empty())
         return;
-    const std::string target = WideToUtf8(path);
-    const std::string temporary = target + ".tmp";
-    FILE* file = fopen(temporary.c_str(), "w");
-    if (!file) {
+    sys::AtomicWrite result = sys::WriteFileAtomically(WideToUtf8(path), [this](FILE* file) {
+        for (size_t i = 0; i < m_Chunks.size(); ++i) {
+            size_t bytes = i + 1 < m_Chunks.size() ? ChunkSize : static_cast<size_t>(m_CurrentChunkSize);
+            size_t written = fwrite(m_Chunks[i].get(), bytes, 1, file);
+            OX_ASSERT_A(written==1);
+            if (written != 1)
+                return false;
+        }
+        return true;
+    });
+    if (result == sys::AtomicWrite::CannotCreate)
         OX_LOG("xmlwriter", diag::LogError, u"Cannot open file to save (\"%ls\")", path.c_str());
-        return;
-    }
-    bool ok = true;
-    for (size_t i = 0; i < m_Chunks.size() && ok; ++i) {
-        size_t bytes = i + 1 < m_Chunks.size() ? ChunkSize : static_cast<size_t>(m_CurrentChunkSize);
-        size_t written = fwrite(m_Chunks[i].get(), bytes, 1, file);
-        OX_ASSERT_A(written==1);
-        ok = written == 1;
-    }
-    ok = ok && fflush(file) == 0 && fsync(fileno(file)) == 0;
-    ok = fclose(file) == 0 && ok;
-    if (!ok) {
+    else if (result == sys::AtomicWrite::CannotWrite)
         OX_LOG("xmlwriter", diag::LogError, u"Cannot write file to save (\"%ls\")", path.c_str());
-        remove(temporary.c_str());
-        return;
-    }
-    if (rename(temporary.c_str(), target.c_str()) != 0) {
+    else if (result == sys::AtomicWrite::CannotReplace)
         OX_LOG("xmlwriter", diag::LogError, u"Cannot replace file to save (\"%ls\")", path.c_str());
-        remove(temporary.c_str());
-        return;
-    }
-    SyncFolderOf(target);
 }
 
 // ---------------------------------------------------------------------------------------

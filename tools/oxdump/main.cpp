@@ -4,6 +4,7 @@
 #include "core/TexturesAlpha.h"
 #include "common/LogToStderr.h"
 #include "diag/Log.h"
+#include "misc/sys/Path.h"
 #include "misc/GamePack.h"
 #include "misc/StringTable.h"
 #include "misc/Unicode.h"
@@ -74,34 +75,6 @@ int UsageError(const std::string& message, const char* usage = kUsage)
     return 2;
 }
 
-bool ReadWhole(const std::string& path, std::string& out)
-{
-    std::ifstream in(path, std::ios::binary);
-    if (!in)
-        return false;
-    std::stringstream buffer;
-    buffer << in.rdbuf();
-    out = buffer.str();
-    return true;
-}
-
-// Writes beside the target, then renames: a failed run leaves the old file.
-bool WriteAtomically(const std::string& path, const std::vector<uint8_t>& bytes)
-{
-    std::string temporary = path + ".tmp";
-    {
-        std::ofstream out(temporary, std::ios::binary | std::ios::trunc);
-        if (!out)
-            return false;
-        out.write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
-        if (!out.flush())
-            return false;
-    }
-    std::error_code error;
-    fs::rename(temporary, path, error);
-    return !error;
-}
-
 int Strings(int argc, char** argv)
 {
     bool utf32 = false;
@@ -115,7 +88,7 @@ int Strings(int argc, char** argv)
     if (files.size() != 2)
         return UsageError("strings needs <strings.xml> <out>", kStringsHelp);
     std::string xml;
-    if (!ReadWhole(files[0], xml)) {
+    if (!ox::misc::sys::ReadWholeFile(files[0], xml)) {
         fprintf(stderr, "oxdump: cannot read %s\n", files[0]);
         return 1;
     }
@@ -130,7 +103,7 @@ int Strings(int argc, char** argv)
         table.BuildFromTexts(texts);
         bytes = table.BuildBinary32();
     }
-    if (!WriteAtomically(files[1], bytes)) {
+    if (!ox::misc::sys::WriteFileAtomically(files[1], bytes.data(), bytes.size())) {
         fprintf(stderr, "oxdump: cannot write %s\n", files[1]);
         return 1;
     }
@@ -169,7 +142,7 @@ int Resources(int argc, char** argv)
     if (files.size() != 2)
         return UsageError("resources needs <resources.xml> <out>", kResourcesHelp);
     std::string xml;
-    if (!ReadWhole(files[0], xml)) {
+    if (!ox::misc::sys::ReadWholeFile(files[0], xml)) {
         fprintf(stderr, "oxdump: cannot read %s\n", files[0].c_str());
         return 1;
     }
@@ -189,7 +162,7 @@ int Resources(int argc, char** argv)
         fprintf(stderr, "oxdump: %s is not valid\n", files[0].c_str());
         return 1;
     }
-    if (!WriteAtomically(files[1], bulk)) {
+    if (!ox::misc::sys::WriteFileAtomically(files[1], bulk.data(), bulk.size())) {
         fprintf(stderr, "oxdump: cannot write %s\n", files[1].c_str());
         return 1;
     }
@@ -210,7 +183,7 @@ bool DecodeFile(const std::string& path, ox::misc::imagelib::Image& image)
 {
     std::unique_ptr<ox::misc::imagelib::CImageDecoder> decoder = ox::misc::imagelib::MakeDecoder(path.c_str());
     std::string data;
-    if (!decoder || !ReadWhole(path, data)) {
+    if (!decoder || !ox::misc::sys::ReadWholeFile(path, data)) {
         fprintf(stderr, "oxdump: cannot read the image %s\n", path.c_str());
         return false;
     }
@@ -247,7 +220,7 @@ int TexturesAlpha(int argc, char** argv)
         std::sort(images.begin(), images.end(), [](const auto& a, const auto& b) { return a.second < b.second; });
     } else {
         std::string list;
-        if (!ReadWhole(files[0], list)) {
+        if (!ox::misc::sys::ReadWholeFile(files[0], list)) {
             fprintf(stderr, "oxdump: cannot read %s\n", files[0].c_str());
             return 1;
         }
@@ -286,7 +259,7 @@ int TexturesAlpha(int argc, char** argv)
         fprintf(stderr, "oxdump: %s\n", error.c_str());
         return 1;
     }
-    if (!WriteAtomically(files[1], table)) {
+    if (!ox::misc::sys::WriteFileAtomically(files[1], table.data(), table.size())) {
         fprintf(stderr, "oxdump: cannot write %s\n", files[1].c_str());
         return 1;
     }
@@ -416,7 +389,7 @@ int Show(int argc, char** argv)
         return UsageError("show needs one file", kShowHelp);
     const std::string path = argv[2];
     std::string bytes;
-    if (!ReadWhole(path, bytes)) {
+    if (!ox::misc::sys::ReadWholeFile(path, bytes)) {
         fprintf(stderr, "oxdump: cannot read %s\n", path.c_str());
         return 1;
     }

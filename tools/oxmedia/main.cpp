@@ -4,6 +4,7 @@
 #include "core/TexturesAlpha.h"
 #include "common/LogToStderr.h"
 #include "diag/Log.h"
+#include "misc/sys/Path.h"
 #include "misc/imagelib/ImageLib.h"
 #include "misc/imagelib/MediaWriter.h"
 #include "misc/imagelib/PvrContainer.h"
@@ -76,38 +77,9 @@ int UsageError(const std::string& message, const char* usage = kUsage)
     return 2;
 }
 
-bool ReadWhole(const std::string& path, std::vector<uint8_t>& out)
-{
-    std::ifstream in(path, std::ios::binary);
-    if (!in)
-        return false;
-    std::stringstream buffer;
-    buffer << in.rdbuf();
-    std::string text = buffer.str();
-    out.assign(text.begin(), text.end());
-    return true;
-}
-
-// Writes beside the target, then renames: a failed run leaves the old file.
-bool WriteAtomically(const std::string& path, const std::vector<uint8_t>& bytes)
-{
-    std::string temporary = path + ".tmp";
-    {
-        std::ofstream out(temporary, std::ios::binary | std::ios::trunc);
-        if (!out)
-            return false;
-        out.write(reinterpret_cast<const char*>(bytes.data()), static_cast<std::streamsize>(bytes.size()));
-        if (!out.flush())
-            return false;
-    }
-    std::error_code error;
-    fs::rename(temporary, path, error);
-    return !error;
-}
-
 bool Write(const std::string& path, const std::vector<uint8_t>& bytes)
 {
-    if (WriteAtomically(path, bytes))
+    if (ox::misc::sys::WriteFileAtomically(path, bytes.data(), bytes.size()))
         return true;
     fprintf(stderr, "oxmedia: cannot write %s\n", path.c_str());
     return false;
@@ -120,8 +92,8 @@ bool Decode(const std::string& path, Image& image)
         fprintf(stderr, "oxmedia: %s: only .png and .jpg images can be read\n", path.c_str());
         return false;
     }
-    std::vector<uint8_t> data;
-    if (!ReadWhole(path, data)) {
+    std::string data;
+    if (!ox::misc::sys::ReadWholeFile(path, data)) {
         fprintf(stderr, "oxmedia: cannot read %s\n", path.c_str());
         return false;
     }
@@ -364,8 +336,8 @@ int Info(int argc, char** argv)
     int status = 0;
     for (int i = 2; i < argc; ++i) {
         std::string path = argv[i];
-        std::vector<uint8_t> data;
-        if (!ReadWhole(path, data)) {
+        std::string data;
+        if (!ox::misc::sys::ReadWholeFile(path, data)) {
             fprintf(stderr, "oxmedia: cannot read %s\n", path.c_str());
             status = 1;
             continue;

@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <cstdio>
 #include <dirent.h>
+#include <fcntl.h>
 #include <filesystem>
 #include <fnmatch.h>
 #include <sys/stat.h>
@@ -25,10 +26,10 @@ bool IsSeparator(wchar c) { return c == u'/' || c == u'\\'; }
 // The wide length under the name the contract text uses.
 size_t wcslen(const wchar* text) { return WideLength(text); }
 
-// A name for the temporary file beside `path`, unique for this process.
+// The name of the temporary file written beside `path` before it replaces it.
 std::string TemporaryBeside(const std::string& path)
 {
-    return path + ".tmp" + std::to_string(getpid());
+    return path + ".tmp";
 }
 
 void AddFullAccess(const std::string& path, const struct stat& info)
@@ -156,43 +157,78 @@ bool Compress(const wstring& source, const wstring& destination)
     return ok;
 }
 
+AtomicWrite WriteFileAtomically(const std::string& path, const std::function<bool(FILE*)>& emit)
+{
+    const std::string temporary = TemporaryBeside(path);
+    FILE* out = fopen(temporary.c_str(), "wb");
+    if (!out)
+        return AtomicWrite::CannotCreate;
+    bool ok = emit(out);
+    ok = ok && fflush(out) == 0 && fsync(fileno(out)) == 0;
+    ok = fclose(out) == 0 && ok;
+    if (!ok) {
+        remove(temporary.c_str());
+        return AtomicWrite::CannotWrite;
+    }
+    if (rename(temporary.c_str(), path.c_str()) != 0) {
+        remove(temporary.c_str());
+        return AtomicWrite::CannotReplace;
+    }
+    // The rename itself reaches the disk with the folder.
+    size_t slash = path.rfind('/');
+    std::string folder = slash == std::string::npos ? "." : (slash == 0 ? "/" : path.substr(0, slash));
+    int fd = open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (fd >= 0) {
+        fsync(fd);
+        close(fd);
+    }
+    return AtomicWrite::Done;
+}
+
+bool WriteFileAtomically(const std::string& path, const void* data, size_t size)
+{
+    return WriteFileAtomically(path, [&](FILE* out) { return size == 0 || fwrite(data, size, 1, out) == 1; }) ==
+           AtomicWrite::Done;
+}
+
+bool ReadWholeFile(const std::string& path, std::string& out)
+{
+    out.clear();
+    FILE* in = fopen(path.c_str(), "rb");
+    if (!in)
+        return false;
+    char block[65536];
+    size_t n;
+    while ((n = fread(block, 1, sizeof block, in)) > 0)
+        out.append(block, n);
+    bool ok = !ferror(in);
+    fclose(in);
+    return ok;
+}
+
 bool Uncompress(const wstring& source, const wstring& destination)
 {
-    std::string target = NativePath(destination);
     gzFile in = gzopen(NativePath(source).c_str(), "rb");
     if (!in)
         return false;
-    std::string temporary = TemporaryBeside(target);
-    FILE* out = fopen(temporary.c_str(), "wb");
-    if (!out) {
-        gzclose(in);
-        return false;
-    }
-    std::vector<char> block(kGzipBlock);
-    bool ok = true;
-    for (;;) {
-        int n = gzread(in, block.data(), static_cast<unsigned>(block.size()));
-        if (n < 0) {
-            ok = false;
-            break;
+    AtomicWrite result = WriteFileAtomically(NativePath(destination), [in](FILE* out) {
+        std::vector<char> block(kGzipBlock);
+        for (;;) {
+            int n = gzread(in, block.data(), static_cast<unsigned>(block.size()));
+            if (n < 0)
+                return false;
+            if (n == 0)
+                break;
+            if (fwrite(block.data(), 1, static_cast<size_t>(n), out) != static_cast<size_t>(n))
+                return false;
         }
-        if (n > 0 && fwrite(block.data(), 1, static_cast<size_t>(n), out) != static_cast<size_t>(n)) {
-            ok = false;
-            break;
-        }
-        if (n == 0)
-            break;
-    }
-    int error = Z_OK;
-    gzerror(in, &error);
-    ok = ok && error == Z_OK;
+        int error = Z_OK;
+        gzerror(in, &error);
+        return error == Z_OK;
+    });
     // A stream cut short is reported again by the close.
-    ok = gzclose(in) == Z_OK && ok;
-    ok = fclose(out) == 0 && ok;
-    ok = ok && rename(temporary.c_str(), target.c_str()) == 0;
-    if (!ok)
-        remove(temporary.c_str());
-    return ok;
+    bool closed = gzclose(in) == Z_OK;
+    return result == AtomicWrite::Done && closed;
 }
 
 void ListFiles(std::vector<wstring>& _list, const wchar* _path_and_name_of_folder)

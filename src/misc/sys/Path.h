@@ -4,6 +4,8 @@
 #include "misc/WideChar.h"
 
 #include <cstdint>
+#include <cstdio>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -32,6 +34,18 @@ int CalcFileCRC(const wstring& path);
 // Gives everyone full access: read and write for files, everything for folders. With
 // `inherit`, what a folder holds now is changed too. Failures are ignored.
 void SetNamedFullAccess(const wstring& path, bool inherit);
+
+// How a file written through a temporary file came out.
+enum class AtomicWrite { Done, CannotCreate, CannotWrite, CannotReplace };
+
+// Writes `path` through a temporary file beside it: `emit` fills the file, which is then
+// flushed to disk and renamed over the old one (and the rename made durable). On any
+// failure the temporary file is removed and an old file stays as it was.
+AtomicWrite WriteFileAtomically(const std::string& path, const std::function<bool(FILE*)>& emit);
+bool WriteFileAtomically(const std::string& path, const void* data, size_t size);
+
+// The whole content of a file; false if it cannot be read.
+bool ReadWholeFile(const std::string& path, std::string& out);
 
 // gzip a file into another and back, through zlib in blocks of 32768 bytes. The
 // destination is written beside itself and renamed into place, so a failure leaves an
