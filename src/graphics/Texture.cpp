@@ -253,22 +253,11 @@ bool CSurface::LoadBits(const void* _data, size_t _data_size, unsigned _width, u
 
 // Texture ----------------------------------------------------------------------------
 
+// One frame covering the whole surface.
 CTexture::CTexture(CSurface* surface)
+    : CTexture(surface, {UVRect{0, 0, 1, 1}}, surface ? static_cast<uint16_t>(surface->GetWidth()) : uint16_t(0),
+               surface ? static_cast<uint16_t>(surface->GetHeight()) : uint16_t(0))
 {
-    TextureDesc* desc = NewDesc(1);
-    desc->Parts()[0] = {0, 0, 1, 1};
-    if (surface) {
-        desc->frame_width = surface->GetWidth();
-        desc->frame_height = surface->GetHeight();
-    }
-    desc->frame_delays[0] = 0;
-    desc->frame_delays_count = 1;
-    desc->frame_map[0] = 0;
-    desc->frame_map_length = 1;
-    m_Data = desc;
-    m_Surface = surface;
-    if (m_Surface)
-        m_Surface->AddRef();
 }
 
 CTexture::CTexture(CSurface* surface, const std::vector<UVRect>& parts, uint16_t frameWidth, uint16_t frameHeight)

@@ -1,6 +1,6 @@
 #pragma once
 // Fixed character classes for UTF-16 units, the same on every machine and in every locale
-// (the C library's classes depend on the locale and on the width of wchar_t).
+// (the C library's classes depend on the locale and on the platform's wide character type).
 #include "misc/WideChar.h"
 
 namespace ox::misc {

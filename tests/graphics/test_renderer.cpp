@@ -23,11 +23,7 @@ struct RendererFixture : ::testing::Test {
 
     void Make(unsigned width, unsigned height)
     {
-        auto owned = std::make_unique<RecordingBackend>();
-        backend = owned.get();
-        renderer = std::make_unique<CRenderer>(std::move(owned));
-        renderer->SetSourceResolution(1024, 768);
-        renderer->InitWindow(false, true, width, height);
+        renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, width, height);
         ASSERT_TRUE(renderer->BeginScene());
         backend->ClearRecord();
     }

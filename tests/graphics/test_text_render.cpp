@@ -36,11 +36,7 @@ struct TextFixture : ::testing::Test {
 
     void SetUp() override
     {
-        auto owned = std::make_unique<RecordingBackend>();
-        backend = owned.get();
-        renderer = std::make_unique<CRenderer>(std::move(owned));
-        renderer->SetSourceResolution(1024, 768);
-        renderer->InitWindow(false, true, 1024, 768);
+        renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, 1024, 768);
         ASSERT_TRUE(renderer->BeginScene());
         surface = std::make_unique<CSurface>(128, 32);
         texture = std::make_unique<CTexture>(surface.get());

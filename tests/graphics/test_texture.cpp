@@ -15,11 +15,7 @@ struct SurfaceFixture : ::testing::Test {
     std::unique_ptr<CRenderer> renderer;
     void SetUp() override
     {
-        auto owned = std::make_unique<RecordingBackend>();
-        backend = owned.get();
-        renderer = std::make_unique<CRenderer>(std::move(owned));
-        renderer->SetSourceResolution(64, 64);
-        renderer->InitWindow(false, true, 64, 64);
+        renderer = oxtest::MakeRecordingRenderer(backend, 64, 64, 64, 64);
     }
 };
 

@@ -19,11 +19,7 @@ struct Device : ::testing::Test {
     std::unique_ptr<CRenderer> renderer;
     void SetUp() override
     {
-        auto owned = std::make_unique<RecordingBackend>();
-        backend = owned.get();
-        renderer = std::make_unique<CRenderer>(std::move(owned));
-        renderer->SetSourceResolution(256, 256);
-        renderer->InitWindow(false, true, 256, 256);
+        renderer = oxtest::MakeRecordingRenderer(backend, 256, 256, 256, 256);
         SetFrameNumber(100);
     }
 };

@@ -240,4 +240,16 @@ void RecordingBackend::ReleasePixelShader(CDeviceShader* s)
     delete static_cast<Shader*>(s);
 }
 
+std::unique_ptr<ox::graphics::CRenderer> MakeRecordingRenderer(RecordingBackend*& backend, int sourceWidth,
+                                                               int sourceHeight, unsigned windowWidth,
+                                                               unsigned windowHeight)
+{
+    auto owned = std::make_unique<RecordingBackend>();
+    backend = owned.get();
+    auto renderer = std::make_unique<ox::graphics::CRenderer>(std::move(owned));
+    renderer->SetSourceResolution(sourceWidth, sourceHeight);
+    renderer->InitWindow(false, true, windowWidth, windowHeight);
+    return renderer;
+}
+
 } // namespace oxtest

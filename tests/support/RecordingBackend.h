@@ -3,6 +3,7 @@
 // and can be told to fail (device creation, scene start, texture creation, the end-of-
 // frame query) or to report a lost device.
 #include "graphics/RenderBackend.h"
+#include "graphics/Renderer.h"
 
 #include <memory>
 #include <string>
@@ -106,5 +107,11 @@ private:
     int m_NextTexture = 1;
     bool m_Query = false;
 };
+
+// A renderer drawing into a new recording backend (handed out through `backend`): a
+// source of sourceWidth x sourceHeight in a window of windowWidth x windowHeight.
+std::unique_ptr<ox::graphics::CRenderer> MakeRecordingRenderer(RecordingBackend*& backend, int sourceWidth,
+                                                               int sourceHeight, unsigned windowWidth,
+                                                               unsigned windowHeight);
 
 } // namespace oxtest

@@ -5,6 +5,7 @@
 #include "graphics/Texture.h"
 #include "misc/CharClass.h"
 #include "misc/Unicode.h"
+#include "misc/XmlWriter.h"
 #include "misc/imagelib/MediaWriter.h"
 
 #include <ft2build.h>
@@ -26,6 +27,8 @@
 namespace fs = std::filesystem;
 using ox::wchar;
 using ox::wstring;
+
+using ox::misc::EscapeXml;
 
 namespace {
 
@@ -242,22 +245,6 @@ bool ParseArguments(int argc, char** argv, Options& options, bool& help)
     if (options.image.empty())
         options.image = options.name;
     return true;
-}
-
-std::string EscapeXml(const std::string& text)
-{
-    std::string out;
-    for (char c : text) {
-        switch (c) {
-        case '&': out += "&amp;"; break;
-        case '<': out += "&lt;"; break;
-        case '>': out += "&gt;"; break;
-        case '"': out += "&quot;"; break;
-        case '\'': out += "&apos;"; break;
-        default: out += c;
-        }
-    }
-    return out;
 }
 
 std::string Utf8(wchar code) { return ox::misc::WideToUtf8(wstring(1, code)); }

@@ -74,6 +74,7 @@ public:
 
 private:
     struct Source;
+    void PrepareSource(Source& state);
     uint8_t m_Block[kBlockSize];
 };
 

@@ -201,14 +201,19 @@ struct DecompressGuard {
 
 } // namespace
 
-bool CJPEGDecoder::GetInfo(const void* data, size_t size, uint32_t& width, uint32_t& height)
+void CJPEGDecoder::PrepareSource(Source& state)
 {
-    SetSource(data, size);
-    Source state;
     memset(&state, 0, sizeof(state));
     state.decoder = this;
     InstallErrorManager(state.err, SourceName());
     state.cinfo.err = &state.err.pub;
+}
+
+bool CJPEGDecoder::GetInfo(const void* data, size_t size, uint32_t& width, uint32_t& height)
+{
+    SetSource(data, size);
+    Source state;
+    PrepareSource(state);
     DecompressGuard<Source> guard{state};
     uint32_t w = 0, h = 0;
     if (!Source::Start(&state, false, &w, &h))
@@ -223,10 +228,7 @@ bool CJPEGDecoder::Decode(const void* data, size_t size, Image& image)
     image = Image{};
     SetSource(data, size);
     Source state;
-    memset(&state, 0, sizeof(state));
-    state.decoder = this;
-    InstallErrorManager(state.err, SourceName());
-    state.cinfo.err = &state.err.pub;
+    PrepareSource(state);
     DecompressGuard<Source> guard{state};
     uint32_t width = 0, height = 0;
     if (!Source::Start(&state, true, &width, &height))
