@@ -19,7 +19,7 @@ build: configure
 	@cmake --build $(BUILD_DIR)
 
 test: build
-	@cd $(BUILD_DIR) && ctest --output-on-failure $(CTEST_ARGS)
+	@cd $(BUILD_DIR) && ctest --output-on-failure -j2 $(CTEST_ARGS)
 
 run: build
 	@if [ -x $(BUILD_DIR)/src/k17 ]; then \

@@ -44,6 +44,11 @@ void AssertFailedA(const char* expression, const char* file, int line)
     log.Flush();
 }
 
+void DataCheckFailed(const char* expression, const char* file, int line)
+{
+    Log::Instance().Write("data", LogError, "check failed \"%s\", file \"%s\" line %i", expression, file, line);
+}
+
 AssertHandler SetAssertHandler(AssertHandler handler)
 {
     AssertHandler previous = CurrentHandler();

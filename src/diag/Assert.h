@@ -13,6 +13,10 @@ void AssertFailed(const wchar* expression, const wchar* file, int line);
 // Narrow form: logs and flushes only; it never stops the run.
 void AssertFailedA(const char* expression, const char* file, int line);
 
+// A check on data a game maker can get wrong failed: logs the expression, file and line on
+// channel "data" as an error. The caller then returns; the game goes on.
+void DataCheckFailed(const char* expression, const char* file, int line);
+
 // What happens after a failure that is not suppressed. The default prints the failure to
 // standard error and aborts.
 using AssertHandler = std::function<void(const wchar* expression, const wchar* file, int line)>;
@@ -36,4 +40,15 @@ AssertHandler SetAssertHandler(AssertHandler handler);
     do {                                                                                       \
         if (!(cond))                                                                           \
             ::ox::diag::AssertFailedA(#cond, __FILE__, __LINE__);                              \
+    } while (0)
+
+// OX_CHECK_DATA(cond, ...): guards data that a game maker or a damaged file can get wrong (not
+// a programmer's contract). A failure is logged on channel "data" and the enclosing function
+// returns the remaining arguments (nothing for a void function).
+#define OX_CHECK_DATA(cond, ...)                                                               \
+    do {                                                                                       \
+        if (!(cond)) {                                                                         \
+            ::ox::diag::DataCheckFailed(#cond, __FILE__, __LINE__);                            \
+            return __VA_ARGS__;                                                                \
+        }                                                                                      \
     } while (0)

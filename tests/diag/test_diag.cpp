@@ -110,3 +110,34 @@ TEST(Assert, LogsExpressionFileAndLineAndHonoursSupress)
     EXPECT_TRUE(log.Contains("assertion failed \"false\""));
     EXPECT_TRUE(log.Contains("assertion failed \"2 < 1\""));
 }
+
+namespace {
+int GuardedValue(int value)
+{
+    OX_CHECK_DATA(value >= 0, -1);
+    return value * 2;
+}
+void GuardedVoid(bool ok, int& calls)
+{
+    OX_CHECK_DATA(ok);
+    ++calls;
+}
+} // namespace
+
+TEST(Assert, DataCheckLogsAndReturnsWithoutStoppingTheRun)
+{
+    oxtest::LogCapture log;
+    oxtest::AssertCapture capture;
+    EXPECT_EQ(GuardedValue(4), 8);
+    EXPECT_EQ(GuardedValue(-3), -1);
+    int calls = 0;
+    GuardedVoid(false, calls);
+    GuardedVoid(true, calls);
+    EXPECT_EQ(calls, 1);
+    EXPECT_EQ(capture.Count(), 0u) << "a data check never reaches the assertion handler";
+    auto entries = log.Entries();
+    EXPECT_TRUE(std::any_of(entries.begin(), entries.end(), [](const std::string& entry) {
+        return entry.starts_with("data|3|check failed \"value >= 0\", file \"tests/diag/test_diag.cpp\" line ");
+    }));
+    EXPECT_TRUE(log.Contains("check failed \"ok\""));
+}
