@@ -533,11 +533,12 @@ void OnAttributesDone(void* user, misc::XmlRecord* stack, int depth)
     }
 }
 
-// The frame map of n frames for an animation type.
+// The frame map of n frames for an animation type. Two frames or fewer run forward
+// whatever the type.
 std::vector<int> DefaultFrameMap(uint32_t type, int n)
 {
     std::vector<int> map;
-    if (type == TextureDesc::AnimBackwardLoop) {
+    if (type == TextureDesc::AnimBackwardLoop && n > 2) {
         for (int i = n - 1; i >= 0; --i)
             map.push_back(i);
     } else if (type == TextureDesc::AnimPingPong && n > 2) {

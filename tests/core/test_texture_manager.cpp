@@ -175,7 +175,9 @@ TEST(TextureDeclarations, FrameMapsForEachAnimationType)
         {"pingpong", 2, {0, 1}},
         {"pingpong", 3, {0, 1, 2, 1}},
         {"pingpong", 5, {0, 1, 2, 3, 4, 3, 2, 1}},
+        {"backward loop", 2, {0, 1}},
         {"backward loop", 3, {2, 1, 0}},
+        {"backward pingpong", 2, {0, 1}},
         {"backward pingpong", 3, {2, 1, 0, 1}},
         {"backward pingpong", 5, {4, 3, 2, 1, 0, 1, 2, 3}},
         {"none", 5, {0}},
@@ -190,6 +192,10 @@ TEST(TextureDeclarations, FrameMapsForEachAnimationType)
         const TextureDesc* d = loader.Desc(loader.Images()[0]);
         EXPECT_EQ(Map(d), c.map) << c.type << " of " << c.frames;
         EXPECT_EQ(d->total_time, c.map.size() == 1 ? 0u : 7u * c.map.size()) << c.type << " of " << c.frames;
+        // Each entry of the map shows for its 7 ms, in the map's order.
+        const graphics::CTexture texture(nullptr, d);
+        for (size_t i = 0; c.map.size() > 1 && i < c.map.size(); ++i)
+            EXPECT_EQ(texture.GetFrameByTime(int(7 * i + 3)), c.map[i]) << c.type << " of " << c.frames << " at " << i;
     }
 
     // An explicit map is copied, minus entries naming frames that do not exist.
