@@ -256,3 +256,21 @@ TEST_F(Device, ImageDrawsItsFrameWithScaleAndWholePixels)
     EXPECT_TRUE(backend->draws.empty());
     renderer->EndScene();
 }
+
+TEST(Image, FindsTexturesByIdThroughTheLookUpItIsGiven)
+{
+    CSurface sheet(8, 2);
+    CTexture texture(&sheet);
+    CImage::SetTextureLookup([&](const char* id) { return strcmp(id, "sheet") == 0 ? &texture : nullptr; });
+    CImage image;
+    image.SetTexture("sheet");
+    ASSERT_TRUE(image.HasTexture());
+    EXPECT_EQ(image.GetTexture()->GetSurface(), &sheet);
+    image.SetTexture("other");
+    EXPECT_FALSE(image.HasTexture()) << "an unknown id drops the texture";
+    image.SetTexture(static_cast<const char*>(nullptr));
+    EXPECT_FALSE(image.HasTexture());
+    CImage::SetTextureLookup(nullptr);
+    image.SetTexture("sheet");
+    EXPECT_FALSE(image.HasTexture()) << "without a look-up no id is known";
+}
