@@ -62,28 +62,16 @@ bool ReadImageDimensions(misc::CGamePack& pack, const char* path, uint32_t& widt
 {
     if (!path || !*path)
         return false;
+    if (IsContainerPath(path))
+        return misc::imagelib::PvrGetInfo(path, width, height, internal_format, &pack);
+    std::unique_ptr<misc::imagelib::CImageDecoder> decoder = misc::imagelib::MakeDecoder(path);
     unsigned size = 0;
-    const void* data = pack.Open(path, &size);
+    const void* data = decoder ? pack.Open(path, &size) : nullptr;
     if (!data)
         return false;
-    bool ok = false;
-    if (IsContainerPath(path)) {
-        auto parse = [&](const void* bytes, size_t length) {
-            misc::imagelib::PvrTexture texture;
-            if (!misc::imagelib::PvrParse(bytes, length, path, texture))
-                return false;
-            width = texture.width;
-            height = texture.height;
-            internal_format = texture.internal_format;
-            return true;
-        };
-        ok = EndsWith(path, ".pvrlzo") ? misc::imagelib::PvrDecompressLzo(data, size, path, parse)
-                                       : parse(data, size);
-    } else if (std::unique_ptr<misc::imagelib::CImageDecoder> decoder = misc::imagelib::MakeDecoder(path)) {
-        decoder->SetName(path);
-        ok = decoder->GetInfo(data, size, width, height);
-        internal_format = graphics::FormatA8R8G8B8;
-    }
+    decoder->SetName(path);
+    const bool ok = decoder->GetInfo(data, size, width, height);
+    internal_format = graphics::FormatA8R8G8B8;
     pack.Close(data);
     return ok;
 }
@@ -458,7 +446,7 @@ void OnAttributesDone(void* user, misc::XmlRecord* stack, int depth)
         if (const std::string* h = Attribute(c, "height"))
             record.height = static_cast<uint16_t>(std::clamp(ToInt(*h), 0, 0xFFFF));
         record.internal_format = graphics::FormatA8R8G8B8;
-        if (EndsWith(*path, ".pvr")) {
+        if (IsContainerPath(path->c_str())) {
             uint32_t w = 0, h = 0;
             unsigned format = 0;
             if (c.pack && ReadImageDimensions(*c.pack, path->c_str(), w, h, format))
