@@ -5,6 +5,7 @@
 #include "core/TimeManager.h"
 #include "diag/Assert.h"
 #include "diag/Log.h"
+#include "graphics/Image.h"
 #include "lua/Lua.h"
 #include "misc/StringTable.h"
 #include "misc/Unicode.h"
@@ -104,6 +105,7 @@ bool CApplication::Init()
     }
     CTextureManager::Instance().SetAllOnDemand(allOnDemand);
     m_Renderer.AddDeviceResourceOwner(&CTextureManager::Instance());
+    graphics::CImage::SetTextureLookup([](const char* id) { return CTextureManager::Instance().GetItem(id); });
     // The display modes can be listed once the platform layer is up.
     m_Renderer.EnumResolutions();
     OX_LOG("app", diag::LogInfo, "app init complete...");

@@ -2,12 +2,14 @@
 // The texture declarations: every surface (an image file) and every texture (an image id
 // with its parts of a surface and its animation) of the game, in one block read in place,
 // the "bulk". properties/resources.bindump is that block as a file; without it the block is
-// built from properties/resources.xml.
+// built from properties/resources.xml. TextureDeclarationsBindump.cpp reads and checks the
+// bulk, TextureDeclarationsXml.cpp converts the XML form.
 #include "graphics/Texture.h"
 #include "misc/String.h"
 
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <string>
 #include <vector>
 
@@ -30,6 +32,7 @@ public:
     static constexpr size_t MaximumParts = 512;
     // Group flags.
     static constexpr uint32_t GroupLoadOnDemand = 1;
+    static constexpr const char* LogChannel = "texman";
 
     using TextureDesc = graphics::TextureDesc;
 
@@ -93,6 +96,8 @@ public:
     uint32_t SurfaceIndex(const TextureDesc& desc) const;
     const GroupRecord* Group(uint32_t offset) const;
 
+    // The byte order of ids and paths, in which the tables are sorted and searched.
+    static int CompareIds(const char* a, const char* b) { return strcmp(a, b); }
     // The index of an image id in the table, or -1: a binary search in byte order.
     int FindImageIndex(const char* id) const;
     const ImageEntry* FindImage(const char* id) const;
@@ -104,6 +109,7 @@ public:
 
 private:
     void Release();
+    misc::CGamePack& Pack() const;
 
     misc::CGamePack* m_Pack;
     const Header* m_Data = nullptr;

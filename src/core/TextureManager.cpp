@@ -23,6 +23,19 @@ using graphics::UVRect;
 
 misc::CGamePack& PackOf(misc::CGamePack* pack) { return pack ? *pack : misc::g_GamePack::Instance(); }
 
+// A level of the surface's format that draws nothing: zero is transparent in every format
+// with alpha, and a DXT1 block of two zero colours is transparent on index 3. R5G6B5 has
+// no alpha: black.
+std::vector<uint8_t> BlankLevel(const CSurface& surface)
+{
+    const uint8_t format = surface.GetInternalFormat();
+    std::vector<uint8_t> level(misc::imagelib::PvrTextureBytes(format, surface.GetWidth(), surface.GetHeight()), 0);
+    if (format == graphics::FormatDXT1)
+        for (size_t block = 0; block + 8 <= level.size(); block += 8)
+            memset(&level[block + 4], 0xFF, 4);
+    return level;
+}
+
 } // namespace
 
 CTextureManager::CTextureManager(misc::CGamePack* pack, Clock clock)
@@ -199,18 +212,10 @@ bool CTextureManager::FillFromFile(CSurface& surface)
     misc::CGamePack& pack = PackOf(m_Pack);
     bool loaded = false;
     if (IsContainerPath(path)) {
-        unsigned size = 0;
-        if (const void* data = pack.Open(path, &size)) {
-            auto load = [&](const void* bytes, size_t length) {
-                misc::imagelib::PvrTexture texture;
-                return misc::imagelib::PvrParse(bytes, length, path, texture) &&
-                       surface.LoadBits(texture.data, texture.size, texture.width, texture.height,
-                                        static_cast<uint8_t>(texture.internal_format));
-            };
-            loaded = strstr(path, ".pvrlzo") ? misc::imagelib::PvrDecompressLzo(data, size, path, load)
-                                             : load(data, size);
-            pack.Close(data);
-        }
+        loaded = misc::imagelib::PvrLoadBits(path, [&](const misc::imagelib::PvrTexture& texture) {
+            return surface.LoadBits(texture.data, texture.size, texture.width, texture.height,
+                                    static_cast<uint8_t>(texture.internal_format));
+        }, &pack);
         if (!loaded)
             OX_LOG(kChannel, diag::LogError, "Cannot load surface data with pvrimagecontainer: \"%s\"", path);
     } else {
@@ -236,10 +241,11 @@ bool CTextureManager::FillFromFile(CSurface& surface)
     if (!loaded)
         ReportTextures(surface);
     // A surface without its image draws nothing rather than what the device had.
-    if (!loaded && surface.IsValid() && surface.GetInternalFormat() == graphics::FormatA8R8G8B8) {
-        std::vector<uint32_t> clear(size_t(surface.GetWidth()) * surface.GetHeight(), 0);
-        surface.LoadBits(clear.data(), clear.size() * 4, surface.GetWidth(), surface.GetHeight(),
-                         graphics::FormatA8R8G8B8);
+    if (!loaded && surface.IsValid()) {
+        const std::vector<uint8_t> blank = BlankLevel(surface);
+        if (!blank.empty())
+            surface.LoadBits(blank.data(), blank.size(), surface.GetWidth(), surface.GetHeight(),
+                             surface.GetInternalFormat());
     }
     return loaded;
 }

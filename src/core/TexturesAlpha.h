@@ -6,8 +6,6 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <string>
-#include <vector>
 
 namespace ox::misc {
 class CGamePack;
@@ -84,6 +82,8 @@ public:
     const TextureAlphaDesc* Find(const char* id) const;
     bool HasMask(const char* id) const { return Find(id) != nullptr; }
     uint32_t Count() const { return m_Header ? m_Header->count : 0; }
+    // The Count() records in id order, in place (null when unavailable).
+    const TextureAlphaDesc* Records() const { return m_Records; }
 
     // Whether the pixel (x, y) of the texture is solid. The store must be available and
     // hold the id (contract failures otherwise). Points outside the image, and points the
@@ -104,22 +104,5 @@ private:
     const TextureAlphaDesc* m_Records = nullptr;
     size_t m_Size = 0;
 };
-
-// One image for the builder: its id, size and 0xAARRGGBB pixels (a pixel is solid when its
-// alpha is not 0).
-struct AlphaMaskSource {
-    std::string id;
-    uint32_t width = 0;
-    uint32_t height = 0;
-    std::vector<uint32_t> pixels;
-    // 1: rows, 2: columns, 0: whichever takes fewer runs.
-    int order = 0;
-};
-
-// Builds a texturesalpha.bindump image: records sorted by id, hashes set, uniform images
-// without runs. False with a reason for an id that is too long or repeated, or an image
-// too big for the format.
-bool BuildTexturesAlpha(const std::vector<AlphaMaskSource>& sources, std::vector<uint8_t>& out,
-                        std::string* error = nullptr);
 
 } // namespace ox::core

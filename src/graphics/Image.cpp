@@ -1,11 +1,18 @@
 #include "graphics/Image.h"
 
-#include "core/TextureManager.h"
 #include "graphics/Renderer.h"
 
 #include <cmath>
 
 namespace ox::graphics {
+
+namespace {
+
+CImage::TextureLookup g_TextureLookup;
+
+} // namespace
+
+void CImage::SetTextureLookup(TextureLookup lookup) { g_TextureLookup = std::move(lookup); }
 
 void CImage::Init(const CTexture* texture)
 {
@@ -31,7 +38,7 @@ void CImage::SetTexture(const CTexture* texture, bool reset)
 
 void CImage::SetTexture(const char* id, bool reset)
 {
-    SetTexture(core::CTextureManager::Instance().GetItem(id), reset);
+    SetTexture(id && g_TextureLookup ? g_TextureLookup(id) : nullptr, reset);
 }
 
 void CImage::ResetTimer(bool reset)

@@ -8,6 +8,7 @@
 #include "misc/Rect.h"
 #include "misc/Vector.h"
 
+#include <functional>
 #include <memory>
 
 namespace ox::graphics {
@@ -17,6 +18,11 @@ class CRenderer;
 class CImage : public core::CTimerWrapper {
 public:
     enum Flags : uint8_t { FlagBoxImage = 1, FlagIntDest = 2 };
+    // The texture of a declared id, or null.
+    using TextureLookup = std::function<const CTexture*(const char* id)>;
+
+    // How every image finds a texture by id; set by whoever holds the declared textures.
+    static void SetTextureLookup(TextureLookup lookup);
 
     CImage() = default;
     explicit CImage(const CTexture* texture) { Init(texture); }
@@ -27,7 +33,7 @@ public:
     // With reset, an animated texture starts again at time 0 and speed 1; without, a timer
     // is only made when an animated texture has none. Null drops the texture.
     void SetTexture(const CTexture* texture, bool reset = true);
-    // By declared id, through the texture manager; an unknown id drops the texture.
+    // By declared id, through the look-up; an unknown id (or no look-up) drops the texture.
     void SetTexture(const char* id, bool reset = true);
     const CTexture* GetTexture() const { return HasTexture() ? &m_Texture : nullptr; }
     bool HasTexture() const { return m_Texture.GetData() != nullptr; }

@@ -179,8 +179,9 @@ public:
     }
     bool Char(TextWalkContext& c, const TextCharInfo& info) override
     {
+        // The point and the characters' places are both relative to the box.
         const float px = static_cast<float>(point.X), py = static_cast<float>(point.Y);
-        const float x = BoxX(c) + info.x, y = BoxY(c) + info.y;
+        const float x = info.x, y = info.y;
         const float w = info.character->Width, h = c.line_height;
         const bool onLine = py >= y && py < y + h;
         if (onLine && px >= x && px < x + w) {

@@ -85,8 +85,8 @@ public:
     // The box of the character at `index`: its position, advance and PixHeight.
     bool GetCharRect(const CFont* _font, const wchar* _string, const misc::IntRect& rect, unsigned flags,
                      unsigned length, unsigned index, misc::IntRect& out);
-    // The character under a point (canvas units). `exact`: only a point inside a character
-    // counts; otherwise the nearest character of the line under the point.
+    // The character under a point given relative to the box's corner. `exact`: only a point
+    // inside a character counts; otherwise the nearest character of the line under the point.
     bool HitTest(const CFont* _font, const wchar* _string, const misc::IntRect& rect, unsigned flags,
                  unsigned length, bool exact, const misc::IntVector& point, int& index, bool& leftHalf,
                  bool& topHalf);

@@ -229,9 +229,14 @@ bool CSurface::LoadBits(const void* _data, size_t _data_size, unsigned _width, u
     OX_ASSERT(_width != 0);
     OX_ASSERT(_height != 0);
     OX_ASSERT(_internal_format != 0);
-    OX_ASSERT(m_InternalFormat == _internal_format);
-    if (!_data || !_data_size || _width != Width || _height != Height || m_InternalFormat != _internal_format)
+    if (!_data || !_data_size || _width != Width || _height != Height)
         return false;
+    // A file made again in another format than its declaration records.
+    if (m_InternalFormat != _internal_format) {
+        OX_LOG("graphics", diag::LogError, "\"%s\" holds surface format %u where its declaration says %u",
+               GetFileName(), unsigned(_internal_format), unsigned(m_InternalFormat));
+        return false;
+    }
     // The data must hold the whole level: rows of pixels, or rows of 4 x 4 blocks.
     const bool blocks = m_InternalFormat == FormatDXT1 || m_InternalFormat == FormatDXT3 ||
                         m_InternalFormat == FormatDXT5;

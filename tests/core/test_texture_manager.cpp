@@ -6,6 +6,7 @@
 #include "misc/GamePack.h"
 #include "misc/PackWriter.h"
 #include "misc/imagelib/MediaWriter.h"
+#include "misc/imagelib/PvrContainer.h"
 #include "support/RecordingBackend.h"
 #include "support/TestSupport.h"
 
@@ -175,7 +176,9 @@ TEST(TextureDeclarations, FrameMapsForEachAnimationType)
         {"pingpong", 2, {0, 1}},
         {"pingpong", 3, {0, 1, 2, 1}},
         {"pingpong", 5, {0, 1, 2, 3, 4, 3, 2, 1}},
+        {"backward loop", 2, {0, 1}},
         {"backward loop", 3, {2, 1, 0}},
+        {"backward pingpong", 2, {0, 1}},
         {"backward pingpong", 3, {2, 1, 0, 1}},
         {"backward pingpong", 5, {4, 3, 2, 1, 0, 1, 2, 3}},
         {"none", 5, {0}},
@@ -190,6 +193,10 @@ TEST(TextureDeclarations, FrameMapsForEachAnimationType)
         const TextureDesc* d = loader.Desc(loader.Images()[0]);
         EXPECT_EQ(Map(d), c.map) << c.type << " of " << c.frames;
         EXPECT_EQ(d->total_time, c.map.size() == 1 ? 0u : 7u * c.map.size()) << c.type << " of " << c.frames;
+        // Each entry of the map shows for its 7 ms, in the map's order.
+        const graphics::CTexture texture(nullptr, d);
+        for (size_t i = 0; c.map.size() > 1 && i < c.map.size(); ++i)
+            EXPECT_EQ(texture.GetFrameByTime(int(7 * i + 3)), c.map[i]) << c.type << " of " << c.frames << " at " << i;
     }
 
     // An explicit map is copied, minus entries naming frames that do not exist.
@@ -538,4 +545,54 @@ TEST_F(ManagerFixture, LooseFileBesideThePackOverridesItsSurface)
     EXPECT_EQ(plain->GetWidth(), 6);
     EXPECT_EQ(plain->GetHeight(), 8);
     EXPECT_NE(plain->GetSurface()->GetD3DTexture(), nullptr);
+}
+
+TEST_F(ManagerFixture, ContainerFormatsAreRecordedAndAFileOfAnotherFormatDrawsNothing)
+{
+    std::vector<uint32_t> pixels;
+    misc::imagelib::MakePattern("circle", 8, 8, pixels);
+    auto write = [&](const std::string& path, unsigned pixelFormat) {
+        std::vector<uint8_t> pvr, lzo;
+        ASSERT_TRUE(misc::imagelib::EncodePvr(pixels.data(), 8, 8, pixelFormat, pvr));
+        if (path.ends_with(".pvrlzo") && misc::imagelib::CompressPvrLzo(pvr.data(), pvr.size(), lzo))
+            pvr.swap(lzo);
+        folder.dir.Write(path, std::string(pvr.begin(), pvr.end()));
+    };
+    write("a.pvr", misc::imagelib::PvrDXT1);
+    write("b.pvrlzo", misc::imagelib::PvrDXT5);
+    // The images have parts: only the surfaces read the files.
+    const std::string xml = Declarations(R"(<surfaces><surface path="a.pvr" width="8" height="8"/>
+        <surface path="b.pvrlzo" width="8" height="8"/></surfaces><group id="g">
+        <image id="a" path="a.pvr"><part rect_x="0" rect_y="0" rect_w="8" rect_h="8"/></image>
+        <image id="b" path="b.pvrlzo"><part rect_x="0" rect_y="0" rect_w="8" rect_h="8"/></image></group>)");
+    CTextureDeclarationsLoader loader(&folder.Pack());
+    ASSERT_TRUE(loader.LoadXml(xml.data(), xml.size(), "r.xml"));
+    EXPECT_EQ(loader.Surfaces()[0].internal_format, graphics::FormatDXT1);
+    EXPECT_EQ(loader.Surfaces()[1].internal_format, graphics::FormatDXT5) << "a compressed container's too";
+    auto bits = [](CTextureManager& manager, const char* id) {
+        auto* device = static_cast<RecordingBackend::Texture*>(manager.GetItem(id)->GetSurface()->GetD3DTexture());
+        return device ? device->bits : std::vector<unsigned char>();
+    };
+    {
+        CTextureManager manager(&folder.Pack(), clock.Source());
+        ASSERT_TRUE(manager.Load(&loader));
+        EXPECT_EQ(bits(manager, "b").size(), 64u);
+        EXPECT_NE(bits(manager, "b"), std::vector<unsigned char>(64, 0)) << "the circle's blocks";
+    }
+
+    // The files were made again in another format after the declarations were compiled.
+    write("a.pvr", misc::imagelib::PvrARGB8888);
+    write("b.pvrlzo", misc::imagelib::PvrARGB4444);
+    CTextureManager manager(&folder.Pack(), clock.Source());
+    ASSERT_TRUE(manager.Load(&loader));
+    oxtest::LogCapture log;
+    // Every DXT1 block transparent: both colours 0 (three-colour mode), each pixel on index 3.
+    std::vector<unsigned char> clearDxt1(32, 0);
+    for (size_t block = 0; block < 32; block += 8)
+        memset(&clearDxt1[block + 4], 0xFF, 4);
+    EXPECT_EQ(bits(manager, "a"), clearDxt1);
+    EXPECT_EQ(bits(manager, "b"), std::vector<unsigned char>(64, 0)) << "DXT5 of alpha 0";
+    EXPECT_TRUE(log.Contains("\"a.pvr\" holds surface format 1 where its declaration says 11"));
+    EXPECT_TRUE(log.Contains("\"b.pvrlzo\" holds surface format 3 where its declaration says 15"));
+    EXPECT_TRUE(log.Contains("Texture \"a\" has no image: \"a.pvr\""));
 }

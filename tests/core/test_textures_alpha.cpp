@@ -1,4 +1,5 @@
 #include "core/TexturesAlpha.h"
+#include "core/TexturesAlphaWriter.h"
 #include "misc/GamePack.h"
 #include "misc/imagelib/MediaWriter.h"
 #include "misc/sys/MemMap.h"
@@ -223,4 +224,52 @@ TEST(TexturesAlpha, LoadReadsThePropertiesFileThroughThePack)
         EXPECT_CONTRACT_FAILURE(EXPECT_FALSE(store.IsOpaque("tex", 5, 5)), "IsAvailable()");
     }
     EXPECT_EQ(ox::misc::sys::MappedFileCount(), mapped);
+}
+
+TEST(TexturesAlpha, TheWriterMakesTheFileFromImagesOnDisk)
+{
+    oxtest::TempDir dir;
+    auto png = [&](const std::string& name, const char* pattern, uint32_t w, uint32_t h) {
+        AlphaMaskSource source = Source(name, pattern, w, h);
+        std::vector<uint8_t> bytes;
+        EXPECT_TRUE(ox::misc::imagelib::EncodePng(source.pixels.data(), w, h, bytes));
+        return dir.Write(name, std::string(bytes.begin(), bytes.end())).string();
+    };
+    const std::string disc = png("disc.png", "circle", 12, 10), stripes = png("stripes.png", "stripes", 9, 4);
+    const std::string out = (dir / "masks.bindump").string();
+    std::string error;
+    size_t size = 0;
+    ASSERT_TRUE(WriteTexturesAlpha({{"ui/disc", disc}, {"stripes", stripes}}, AlphaMaskOrder("rows"), out, error,
+                                   &size)) << error;
+    const std::string table = oxtest::ReadFile(out);
+    EXPECT_EQ(table.size(), size);
+    HandMade file(std::vector<uint8_t>(table.begin(), table.end()));
+    CTexturesAlpha store;
+    ASSERT_TRUE(store.LoadFromMemory(file.data(), file.size));
+    EXPECT_TRUE(store.IsOpaque("ui/disc", 6, 5));
+    EXPECT_FALSE(store.IsOpaque("ui/disc", 0, 0));
+    // Rows of 3 clear, 5 solid, 1 clear: the clear ends of rows join.
+    EXPECT_EQ(DescribeMask(store.Records()[0]), "stripes 9x4 9 runs by rows");
+    EXPECT_EQ(DescribeMask(store.Records()[1]).rfind("ui/disc 12x10 ", 0), 0u);
+    AlphaMaskSource solid = Source("solid", "checker", 3, 3);
+    std::vector<uint8_t> bytes = Build({solid});
+    EXPECT_EQ(DescribeMask(*reinterpret_cast<const TextureAlphaDesc*>(bytes.data() + 8)), "solid 3x3 uniform solid");
+
+    // Nothing is written when an image is missing or not an image, or an id repeats.
+    std::filesystem::remove(out);
+    dir.Write("junk.png", "not a picture");
+    const std::pair<std::vector<AlphaMaskFile>, std::string> refused[] = {
+        {{{"a", disc}, {"b", (dir / "gone.png").string()}}, "gone.png"},
+        {{{"a", (dir / "junk.png").string()}}, "junk.png"},
+        {{{"a", (dir / "disc.txt").string()}}, "disc.txt"},
+        {{{"a", disc}, {"a", stripes}}, "\"a\" is given twice"},
+    };
+    for (const auto& [files, reason] : refused) {
+        EXPECT_FALSE(WriteTexturesAlpha(files, 0, out, error));
+        EXPECT_NE(error.find(reason), std::string::npos) << error;
+        EXPECT_FALSE(std::filesystem::exists(out)) << error;
+    }
+    EXPECT_EQ(AlphaMaskOrder("auto"), 0);
+    EXPECT_EQ(AlphaMaskOrder("columns"), 2);
+    EXPECT_EQ(AlphaMaskOrder("diagonal"), -1);
 }

@@ -232,7 +232,8 @@ TEST_F(TextFixture, SelectionBackColourAndLines)
 
 TEST_F(TextFixture, HitTestsAndSizes)
 {
-    const IntRect box {0, 0, 100, 100};
+    // Points are relative to the box, wherever the box lies.
+    const IntRect box {300, 200, 100, 100};
     int index = 0;
     bool left = false, top = false;
     // Inside the second character, right and lower half.
@@ -250,6 +251,8 @@ TEST_F(TextFixture, HitTestsAndSizes)
     ASSERT_TRUE(Text().HitTest(&font, u"ab\ncd", box, 0, 0, false, {80, 25}, index, left, top));
     EXPECT_EQ(index, 4);
     EXPECT_FALSE(Text().HitTest(&font, u"ab", box, 0, 0, false, {5, 60}, index, left, top)) << "below every line";
+    EXPECT_FALSE(Text().HitTest(&font, u"ab\ncd", box, 0, 0, true, {318, 215}, index, left, top))
+        << "a canvas point is outside the box's own space";
 
     // Sizes never wrap: only line feeds add lines.
     IntVector size;

@@ -151,6 +151,13 @@ TEST(TextureFrames, FrameByTimeForEachKindOfAnimation)
     EXPECT_EQ(pp.GetTimeByFrame(3), 60u);
     EXPECT_EQ(pp.GetTimeByFrame(4), 0u) << "past the map";
 
+    // A backward loop walks its map like a loop: from the last frame down, then wraps.
+    auto backward = MakeDesc(TextureDesc::AnimBackwardLoop, {10, 20, 30}, {2, 1, 0});
+    CTexture back(nullptr, reinterpret_cast<TextureDesc*>(backward.data()));
+    const std::pair<int, int> backCases[] = {{0, 2}, {29, 2}, {30, 1}, {49, 1}, {50, 0}, {59, 0}, {60, -1}, {61, 2}};
+    for (auto [time, frame] : backCases)
+        EXPECT_EQ(back.GetFrameByTime(time), frame) << "backward loop at " << time;
+
     auto single = MakeDesc(TextureDesc::AnimLoop, {40}, {0});
     CTexture one(nullptr, reinterpret_cast<TextureDesc*>(single.data()));
     EXPECT_FALSE(one.IsAnimated());
@@ -248,4 +255,22 @@ TEST_F(Device, ImageDrawsItsFrameWithScaleAndWholePixels)
     renderer->Flush();
     EXPECT_TRUE(backend->draws.empty());
     renderer->EndScene();
+}
+
+TEST(Image, FindsTexturesByIdThroughTheLookUpItIsGiven)
+{
+    CSurface sheet(8, 2);
+    CTexture texture(&sheet);
+    CImage::SetTextureLookup([&](const char* id) { return strcmp(id, "sheet") == 0 ? &texture : nullptr; });
+    CImage image;
+    image.SetTexture("sheet");
+    ASSERT_TRUE(image.HasTexture());
+    EXPECT_EQ(image.GetTexture()->GetSurface(), &sheet);
+    image.SetTexture("other");
+    EXPECT_FALSE(image.HasTexture()) << "an unknown id drops the texture";
+    image.SetTexture(static_cast<const char*>(nullptr));
+    EXPECT_FALSE(image.HasTexture());
+    CImage::SetTextureLookup(nullptr);
+    image.SetTexture("sheet");
+    EXPECT_FALSE(image.HasTexture()) << "without a look-up no id is known";
 }

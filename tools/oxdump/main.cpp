@@ -2,13 +2,13 @@
 // what a binary dump holds.
 #include "core/TextureDeclarations.h"
 #include "core/TexturesAlpha.h"
+#include "core/TexturesAlphaWriter.h"
 #include "common/LogToStderr.h"
 #include "diag/Log.h"
 #include "misc/sys/Path.h"
 #include "misc/GamePack.h"
 #include "misc/StringTable.h"
 #include "misc/Unicode.h"
-#include "misc/imagelib/ImageLib.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -179,22 +179,6 @@ bool IsImageFile(const fs::path& path)
     return extension == ".png" || extension == ".jpg";
 }
 
-bool DecodeFile(const std::string& path, ox::misc::imagelib::Image& image)
-{
-    std::unique_ptr<ox::misc::imagelib::CImageDecoder> decoder = ox::misc::imagelib::MakeDecoder(path.c_str());
-    std::string data;
-    if (!decoder || !ox::misc::sys::ReadWholeFile(path, data)) {
-        fprintf(stderr, "oxdump: cannot read the image %s\n", path.c_str());
-        return false;
-    }
-    decoder->SetName(path);
-    if (!decoder->Decode(data.data(), data.size(), image)) {
-        fprintf(stderr, "oxdump: %s is not a valid image\n", path.c_str());
-        return false;
-    }
-    return true;
-}
-
 int TexturesAlpha(int argc, char** argv)
 {
     std::vector<std::string> files;
@@ -206,18 +190,18 @@ int TexturesAlpha(int argc, char** argv)
         return UsageError("texturesalpha needs <folder|list> <out>", kTexturesAlphaHelp);
     int order = 0;
     for (const auto& [name, value] : options) {
-        order = value == "auto" ? 0 : value == "rows" ? 1 : value == "columns" ? 2 : -1;
+        order = ox::core::AlphaMaskOrder(value);
         if (order < 0)
             return UsageError("bad order " + value, kTexturesAlphaHelp);
     }
-    // (id, path) of every image, sorted by path so that the run is the same each time.
-    std::vector<std::pair<std::string, std::string>> images;
+    // Every image, sorted by path so that the run is the same each time.
+    std::vector<ox::core::AlphaMaskFile> images;
     std::error_code fsError;
     if (fs::is_directory(files[0], fsError)) {
         for (const auto& entry : fs::recursive_directory_iterator(files[0], fsError))
             if (entry.is_regular_file() && IsImageFile(entry.path()))
-                images.emplace_back(entry.path().stem().string(), entry.path().string());
-        std::sort(images.begin(), images.end(), [](const auto& a, const auto& b) { return a.second < b.second; });
+                images.push_back({entry.path().stem().string(), entry.path().string()});
+        std::sort(images.begin(), images.end(), [](const auto& a, const auto& b) { return a.path < b.path; });
     } else {
         std::string list;
         if (!ox::misc::sys::ReadWholeFile(files[0], list)) {
@@ -234,36 +218,19 @@ int TexturesAlpha(int argc, char** argv)
             size_t equals = line.find('=');
             std::string path = equals == std::string::npos ? line : line.substr(equals + 1);
             std::string id = equals == std::string::npos ? fs::path(path).stem().string() : line.substr(0, equals);
-            images.emplace_back(id, (base / path).string());
+            images.push_back({id, (base / path).string()});
         }
     }
     if (images.empty()) {
         fprintf(stderr, "oxdump: no images in %s\n", files[0].c_str());
         return 1;
     }
-    std::vector<ox::core::AlphaMaskSource> sources;
-    for (const auto& [id, path] : images) {
-        ox::misc::imagelib::Image image;
-        if (!DecodeFile(path, image))
-            return 1;
-        ox::core::AlphaMaskSource source;
-        source.id = id;
-        source.width = image.width;
-        source.height = image.height;
-        source.pixels = std::move(image.pixels);
-        source.order = order;
-        sources.push_back(std::move(source));
-    }
-    std::vector<uint8_t> table;
-    if (!ox::core::BuildTexturesAlpha(sources, table, &error)) {
+    size_t size = 0;
+    if (!ox::core::WriteTexturesAlpha(images, order, files[1], error, &size)) {
         fprintf(stderr, "oxdump: %s\n", error.c_str());
         return 1;
     }
-    if (!ox::misc::sys::WriteFileAtomically(files[1], table.data(), table.size())) {
-        fprintf(stderr, "oxdump: cannot write %s\n", files[1].c_str());
-        return 1;
-    }
-    printf("%s: %zu masks, %zu bytes\n", files[1].c_str(), sources.size(), table.size());
+    printf("%s: %zu masks, %zu bytes\n", files[1].c_str(), images.size(), size);
     return 0;
 }
 
@@ -311,18 +278,11 @@ void ShowResources(const ox::core::CTextureDeclarationsLoader& loader)
     }
 }
 
-void ShowAlpha(const uint8_t* data, const ox::core::CTexturesAlpha& store)
+void ShowAlpha(const ox::core::CTexturesAlpha& store)
 {
     printf("alpha masks, revision 1: %u masks\n", store.Count());
-    const auto* records = reinterpret_cast<const ox::core::TextureAlphaDesc*>(data + sizeof(ox::core::TexturesAlphaHeader));
-    for (uint32_t r = 0; r < store.Count(); ++r) {
-        const ox::core::TextureAlphaDesc& d = records[r];
-        if (d.uniform)
-            printf("mask %s %ux%u uniform %s\n", d.id.c_str(), d.width, d.height, d.uniform_value ? "solid" : "clear");
-        else
-            printf("mask %s %ux%u %u runs by %s\n", d.id.c_str(), d.width, d.height, d.size / 2,
-                   d.order == 1 ? "rows" : "columns");
-    }
+    for (uint32_t r = 0; r < store.Count(); ++r)
+        printf("mask %s\n", ox::core::DescribeMask(store.Records()[r]).c_str());
 }
 
 uint32_t ReadU32(const uint8_t* p)
@@ -411,7 +371,7 @@ int Show(int argc, char** argv)
     } else if ((magic & 0xFFFFFF) == (ox::core::g_Magick & 0xFFFFFF)) {
         ox::core::CTexturesAlpha store;
         if ((ok = store.LoadFromMemory(data, size, path.c_str())))
-            ShowAlpha(data, store);
+            ShowAlpha(store);
     } else if (memcmp(data, "S16\x01", 4) == 0 || memcmp(data, "S16L", 4) == 0) {
         CStringTable table;
         if ((ok = table.UseTable(data, size, path.c_str())))

@@ -2,6 +2,7 @@
 // containers, builds the alpha-mask table, and describes media files, all with the code
 // the game reads them with.
 #include "core/TexturesAlpha.h"
+#include "core/TexturesAlphaWriter.h"
 #include "common/LogToStderr.h"
 #include "diag/Log.h"
 #include "misc/sys/Path.h"
@@ -87,22 +88,11 @@ bool Write(const std::string& path, const std::vector<uint8_t>& bytes)
 
 bool Decode(const std::string& path, Image& image)
 {
-    std::unique_ptr<CImageDecoder> decoder = MakeDecoder(path.c_str());
-    if (!decoder) {
-        fprintf(stderr, "oxmedia: %s: only .png and .jpg images can be read\n", path.c_str());
-        return false;
-    }
-    std::string data;
-    if (!ox::misc::sys::ReadWholeFile(path, data)) {
-        fprintf(stderr, "oxmedia: cannot read %s\n", path.c_str());
-        return false;
-    }
-    decoder->SetName(path);
-    if (!decoder->Decode(data.data(), data.size(), image)) {
-        fprintf(stderr, "oxmedia: %s is not a valid image\n", path.c_str());
-        return false;
-    }
-    return true;
+    std::string error;
+    if (DecodeImageOnDisk(path, image, error))
+        return true;
+    fprintf(stderr, "oxmedia: %s\n", error.c_str());
+    return false;
 }
 
 // Options shared by the generators: --size WxH and --pattern NAME.
@@ -290,42 +280,27 @@ int Alpha(int argc, char** argv)
     bool ok = Options(argc, argv, 2, args, [&](const std::string& arg, const char* value) {
         if (arg != "--order" || !value)
             return -1;
-        std::string v = value;
-        order = v == "auto" ? 0 : v == "rows" ? 1 : v == "columns" ? 2 : -1;
+        order = ox::core::AlphaMaskOrder(value);
         return order >= 0 ? 1 : -2;
     }, error);
     if (!ok)
         return UsageError(error, kAlphaHelp);
     if (args.size() < 2)
         return UsageError("alpha needs an output file and at least one image", kAlphaHelp);
-    std::vector<ox::core::AlphaMaskSource> sources;
+    std::vector<ox::core::AlphaMaskFile> images;
     for (size_t i = 1; i < args.size(); ++i) {
-        ox::core::AlphaMaskSource source;
-        std::string path = args[i];
-        size_t equals = path.find('=');
-        if (equals != std::string::npos) {
-            source.id = path.substr(0, equals);
-            path = path.substr(equals + 1);
-        } else {
-            source.id = fs::path(path).stem().string();
-        }
-        Image image;
-        if (!Decode(path, image))
-            return 1;
-        source.width = image.width;
-        source.height = image.height;
-        source.pixels = std::move(image.pixels);
-        source.order = order;
-        sources.push_back(std::move(source));
+        const size_t equals = args[i].find('=');
+        if (equals != std::string::npos)
+            images.push_back({args[i].substr(0, equals), args[i].substr(equals + 1)});
+        else
+            images.push_back({fs::path(args[i]).stem().string(), args[i]});
     }
-    std::vector<uint8_t> table;
-    if (!ox::core::BuildTexturesAlpha(sources, table, &error)) {
+    size_t size = 0;
+    if (!ox::core::WriteTexturesAlpha(images, order, args[0], error, &size)) {
         fprintf(stderr, "oxmedia: %s\n", error.c_str());
         return 1;
     }
-    if (!Write(args[0], table))
-        return 1;
-    printf("%s: %zu masks, %zu bytes\n", args[0].c_str(), sources.size(), table.size());
+    printf("%s: %zu masks, %zu bytes\n", args[0].c_str(), images.size(), size);
     return 0;
 }
 
@@ -365,17 +340,8 @@ int Info(int argc, char** argv)
             ox::core::CTexturesAlpha store;
             if ((ok = store.LoadFromMemory(aligned.data(), data.size(), path.c_str()))) {
                 printf("%s: %u masks\n", path.c_str(), store.Count());
-                const auto* records = reinterpret_cast<const ox::core::TextureAlphaDesc*>(
-                    reinterpret_cast<const uint8_t*>(aligned.data()) + sizeof(ox::core::TexturesAlphaHeader));
-                for (uint32_t r = 0; r < store.Count(); ++r) {
-                    const ox::core::TextureAlphaDesc& d = records[r];
-                    if (d.uniform)
-                        printf("  %s %ux%u uniform %s\n", d.id.c_str(), d.width, d.height,
-                               d.uniform_value ? "solid" : "clear");
-                    else
-                        printf("  %s %ux%u %u runs by %s\n", d.id.c_str(), d.width, d.height, d.size / 2,
-                               d.order == 1 ? "rows" : "columns");
-                }
+                for (uint32_t r = 0; r < store.Count(); ++r)
+                    printf("  %s\n", ox::core::DescribeMask(store.Records()[r]).c_str());
             }
         } else {
             fprintf(stderr, "oxmedia: %s: unknown kind of file\n", path.c_str());

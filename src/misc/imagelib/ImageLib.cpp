@@ -3,6 +3,7 @@
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "misc/GamePack.h"
+#include "misc/sys/Path.h"
 
 #include <algorithm>
 #include <cstring>
@@ -105,6 +106,26 @@ bool LoadImage(const char* path, Image& image)
         return false;
     }
     return decoder->DecodeFromFile(path, image);
+}
+
+bool DecodeImageOnDisk(const std::string& path, Image& image, std::string& error)
+{
+    std::unique_ptr<CImageDecoder> decoder = MakeDecoder(path.c_str());
+    std::string data;
+    if (!decoder) {
+        error = path + ": only .png and .jpg images can be read";
+        return false;
+    }
+    if (!sys::ReadWholeFile(path, data)) {
+        error = "cannot read " + path;
+        return false;
+    }
+    decoder->SetName(path);
+    if (!decoder->Decode(data.data(), data.size(), image)) {
+        error = path + " is not a valid image";
+        return false;
+    }
+    return true;
 }
 
 void ResampleImage(const uint32_t* _source, uint32_t _width, uint32_t _height, uint32_t* _destination,

@@ -86,6 +86,9 @@ std::unique_ptr<CImageDecoder> MakeDecoder(const char* path);
 bool GetImageInfo(const char* path, uint32_t& width, uint32_t& height);
 // Decodes an image file; a path without any '.' is a contract failure.
 bool LoadImage(const char* path, Image& image);
+// Decodes a PNG or JPEG file on disk, outside any game pack (content tools). False with the
+// reason, naming the file, in `error`.
+bool DecodeImageOnDisk(const std::string& path, Image& image, std::string& error);
 
 // Encodes RGB JPEG data (alpha is dropped; `grey` writes one channel of luma,
 // `progressive` a progressive file). The quality is capped at 100.

@@ -30,11 +30,11 @@ uint32_t ReadU32(const uint8_t* p)
 
 bool HasPathPart(const char* path, const char* part) { return strstr(path, part) != nullptr; }
 
-// Reads a file through the game pack, decompressing a ".pvrlzo" one, and hands the
-// container image to `use`.
-bool WithContainer(const char* path, const std::function<bool(const void*, size_t)>& use)
+// Reads a file through the pack, decompressing a ".pvrlzo" one, and hands the container
+// image to `use`.
+bool WithContainer(CGamePack* packOrNull, const char* path, const std::function<bool(const void*, size_t)>& use)
 {
-    CGamePack& pack = g_GamePack::Instance();
+    CGamePack& pack = packOrNull ? *packOrNull : g_GamePack::Instance();
     unsigned size = 0;
     const void* file = pack.Open(path, &size);
     if (!file)
@@ -181,11 +181,11 @@ bool PvrIsInLzoStaticBuffer(const void* pointer)
     return p >= g_LzoBuffer && p < g_LzoBuffer + kLzoStaticBufferSize;
 }
 
-bool PvrGetInfo(const char* path, uint32_t& width, uint32_t& height, unsigned& internal_format)
+bool PvrGetInfo(const char* path, uint32_t& width, uint32_t& height, unsigned& internal_format, CGamePack* pack)
 {
     if (!path)
         return false;
-    return WithContainer(path, [&](const void* data, size_t size) {
+    return WithContainer(pack, path, [&](const void* data, size_t size) {
         PvrTexture texture;
         if (!PvrParse(data, size, path, texture))
             return false;
@@ -196,11 +196,11 @@ bool PvrGetInfo(const char* path, uint32_t& width, uint32_t& height, unsigned& i
     });
 }
 
-bool PvrLoadBits(const char* path, const std::function<bool(const PvrTexture&)>& load)
+bool PvrLoadBits(const char* path, const std::function<bool(const PvrTexture&)>& load, CGamePack* pack)
 {
     if (!path)
         return false;
-    return WithContainer(path, [&](const void* data, size_t size) {
+    return WithContainer(pack, path, [&](const void* data, size_t size) {
         PvrTexture texture;
         return PvrParse(data, size, path, texture) && load(texture);
     });

@@ -6,6 +6,10 @@
 #include <cstdint>
 #include <functional>
 
+namespace ox::misc {
+class CGamePack;
+}
+
 namespace ox::misc::imagelib {
 
 struct PvrHeader {
@@ -74,11 +78,14 @@ bool PvrDecompressLzo(const void* file, size_t size, const char* name,
 // Whether a pointer lies in the reused decompression buffer (for tests).
 bool PvrIsInLzoStaticBuffer(const void* pointer);
 
-// The size and surface format of a .pvr or .pvrlzo file read through the game pack.
-bool PvrGetInfo(const char* path, uint32_t& width, uint32_t& height, unsigned& internal_format);
-// Reads a file through the game pack and hands its top level to `load`, returning what it
-// returns; false without calling it when the file is missing or bad.
-bool PvrLoadBits(const char* path, const std::function<bool(const PvrTexture&)>& load);
+// The size and surface format of a .pvr or .pvrlzo file read through `pack` (the
+// process-wide game pack when null).
+bool PvrGetInfo(const char* path, uint32_t& width, uint32_t& height, unsigned& internal_format,
+                CGamePack* pack = nullptr);
+// Reads a file through `pack` (the process-wide game pack when null) and hands its top level
+// to `load`, returning what it returns; false without calling it when the file is missing
+// or bad.
+bool PvrLoadBits(const char* path, const std::function<bool(const PvrTexture&)>& load, CGamePack* pack = nullptr);
 
 // Loads a container file into a surface through its LoadBits(data, size, width, height,
 // internal_format).
