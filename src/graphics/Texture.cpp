@@ -196,10 +196,13 @@ void CSurface::Unload()
 void CSurface::CreateBuffer()
 {
     OX_ASSERT(m_Buffer == 0);
-    OX_ASSERT(Width > 0);
-    OX_ASSERT(Height > 0);
-    if (m_Buffer || Width == 0 || Height == 0)
+    if (m_Buffer)
         return;
+    if (Width == 0 || Height == 0) {
+        // Its image was missing when the declarations were compiled: no pixels, and it draws nothing.
+        OX_LOG("graphics", diag::LogError, "Surface \"%s\" has no size: no pixel buffer", GetFileName());
+        return;
+    }
     GetD3DTexture();
     m_Buffer.reset(new uint32_t[static_cast<size_t>(Width) * Height]());
 }
