@@ -147,8 +147,10 @@ bool CSurface::CreateDeviceTexture()
     IRenderBackend* backend = GetRenderBackend();
     if (!backend || !backend->HasDevice() || Width == 0 || Height == 0)
         return false;
+    // Failures are tried again at each use and logged at the first.
     if (!IsDeviceFormat(m_InternalFormat)) {
-        OX_LOG("graphics", diag::LogError, "unknown format for windows texture: %d", m_InternalFormat);
+        if (FirstDrawProblem(this))
+            OX_LOG("graphics", diag::LogError, "unknown format for windows texture: %d", m_InternalFormat);
         return false;
     }
     const uint64_t bytes = uint64_t(FormatBitsPerPixel(m_InternalFormat)) * Width * Height / 8;
@@ -157,7 +159,8 @@ bool CSurface::CreateDeviceTexture()
                   ? backend->CreateTexture(Width, Height, m_InternalFormat, (m_Flags & FlagRenderTarget) != 0)
                   : nullptr;
     if (!Surface) {
-        CheckResult(ResultOutOfVideoMemory, "Create texture", diag::LogError);
+        if (FirstDrawProblem(this))
+            CheckResult(ResultOutOfVideoMemory, "Create texture", diag::LogError);
         return false;
     }
     m_BytesInVMem = static_cast<unsigned>(bytes);
