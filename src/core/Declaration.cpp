@@ -151,10 +151,11 @@ void OnAttribute(void* user, misc::XmlRecord* stack, int depth, const char* name
     }
     if (taken)
         return;
-    OX_LOG("resdecl", diag::LogError, "%s line %u: %s skipped: its %s \"%.*s\" is longer than %zu characters",
-           context->name, context->LineOf(record), record.userWord2 == EntryGroup ? "group" : "font",
-           attribute.c_str(), static_cast<int>(std::min<size_t>(text.size(), 120)), text.c_str(), kMaxIdLength);
     // The root is the caller's group: it stays, without the id.
+    const char* skipped = depth == 0 ? "the id" : record.userWord2 == EntryGroup ? "group" : "font";
+    OX_LOG("resdecl", diag::LogError, "%s line %u: %s skipped: its %s \"%.*s\" is longer than %zu characters",
+           context->name, context->LineOf(record), skipped, attribute.c_str(),
+           static_cast<int>(std::min<size_t>(text.size(), 120)), text.c_str(), kMaxIdLength);
     if (depth > 0)
         record.userWord2 |= EntryBad;
 }
