@@ -19,7 +19,9 @@ class Declaration {
 public:
     virtual ~Declaration() = default;
     // Takes one attribute of the declaring element (name matched without regard to case).
-    virtual void SetAttribute(const char* name, const std::string& value);
+    // False when the value cannot be taken (an identifier longer than kMaxIdLength): the
+    // loader then drops the declaration.
+    virtual bool SetAttribute(const char* name, const std::string& value);
     // The element is complete.
     virtual void OnEnd() {}
 
@@ -31,7 +33,7 @@ public:
 
 class FontDeclaration : public Declaration {
 public:
-    void SetAttribute(const char* name, const std::string& value) override;
+    bool SetAttribute(const char* name, const std::string& value) override;
 
     InternedId image;
     std::string file;
@@ -118,12 +120,13 @@ protected:
     std::map<InternedId, T> m_Items;
 };
 
-InternedId InternDeclarationId(const char* id);
+// The identifier of an id if one was ever made, else null: a look-up that makes none.
+InternedId FindDeclarationId(const char* id);
 
 template <class T, class D>
 T* CResourceManager<T, D>::GetItem(const char* id)
 {
-    auto it = m_Items.find(InternDeclarationId(id));
+    auto it = m_Items.find(FindDeclarationId(id));
     return it == m_Items.end() ? nullptr : &it->second;
 }
 

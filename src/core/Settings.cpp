@@ -34,15 +34,13 @@ std::set<StringA88, IdLess>& IdPool()
     return *pool;
 }
 
-constexpr size_t kMaxNameLength = StringA88::kCapacity - 1;
-
 } // namespace
 
 const StringA88* InternId(std::string_view name)
 {
-    OX_ASSERT(name.size() <= kMaxNameLength);
-    if (name.size() > kMaxNameLength)
-        name = name.substr(0, kMaxNameLength);
+    OX_ASSERT(name.size() <= kMaxIdLength);
+    if (name.size() > kMaxIdLength)
+        name = name.substr(0, kMaxIdLength);
     if (name.empty())
         name = ""; // a fixed string must not be made from a null pointer
     auto& pool = IdPool();
@@ -296,18 +294,18 @@ struct LoadContext {
 
     unsigned LineOf(const char* where) const
     {
-        return 1 + static_cast<unsigned>(std::count(data, where, '\n'));
+        return misc::XmlLineOf(data, where);
     }
 
     // Names longer than an identifier holds are cut, with a line in the log; `where` (in the
     // data) gives the line.
     std::string_view CheckedName(const char* name, size_t length, const char* where) const
     {
-        if (length > kMaxNameLength) {
+        if (length > kMaxIdLength) {
             OX_LOG("core", diag::LogWarning, "CSettings::LoadXml %s: name \"%.*s\" at line %u is longer than %u characters, cut",
                    file->c_str(), static_cast<int>(std::min<size_t>(length, 200)), name, LineOf(where),
-                   static_cast<unsigned>(kMaxNameLength));
-            length = kMaxNameLength;
+                   static_cast<unsigned>(kMaxIdLength));
+            length = kMaxIdLength;
         }
         return {name, length};
     }
@@ -360,7 +358,7 @@ struct SettingsLoader {
         record.user = node.get();
         if (underName) {
             std::string_view named(*underName);
-            if (named.size() > kMaxNameLength)
+            if (named.size() > kMaxIdLength)
                 named = context.CheckedName(underName->data(), underName->size(), record.name);
             target->AddChild(std::move(node), StringA88(named));
         } else {

@@ -20,7 +20,10 @@ class CSettingsGroup;
 struct SettingsLoader;
 using SettingsGroupPtrT = boost::shared_ptr<CSettingsGroup>;
 
-// The identifier of `name` (at most 87 characters), created at first sight and kept to the
+// The longest name an identifier holds.
+constexpr size_t kMaxIdLength = misc::StringA88::kCapacity - 1;
+
+// The identifier of `name` (at most kMaxIdLength characters), created at first sight and kept to the
 // end of the process.
 const misc::StringA88* InternId(std::string_view name);
 // The identifier of `name` if it was ever interned, else null.

@@ -54,6 +54,8 @@ void SetRenderBackend(IRenderBackend* backend) { g_Backend = backend; }
 RenderDevice* GetRenderDevice() { return g_Device; }
 void SetRenderDevice(RenderDevice* device) { g_Device = device; }
 
+bool FirstDrawProblem(const void* object) { return !g_Device || g_Device->FirstProblemWith(object); }
+
 bool CheckResult(DeviceResult result, const char* what, int level)
 {
     if (result >= 0)
@@ -81,6 +83,7 @@ void RenderDevice::Init()
     if (!device)
         return;
     m_StatesChanged = false;
+    m_ProblemsTold.clear();
     m_WantedBlend = BlendNormal;
     m_AppliedBlend = 0;
     m_WantedShader = m_AppliedShader = nullptr;

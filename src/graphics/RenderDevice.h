@@ -7,6 +7,8 @@
 #include "graphics/RenderBackend.h"
 #include "graphics/RendererState.h"
 
+#include <set>
+
 namespace ox::graphics {
 
 class CPixelShader;
@@ -19,6 +21,10 @@ class RenderDevice;
 // The render device of the one renderer; null while none exists.
 RenderDevice* GetRenderDevice();
 void SetRenderDevice(RenderDevice* device);
+// Whether a problem with `object` that would recur at every draw (a surface that gets no
+// device texture, a font whose glyphs have none) should be logged now: true the first time
+// for each object while the render device lives, and always without one.
+bool FirstDrawProblem(const void* object);
 
 struct Stage {
     static constexpr unsigned StatesCount = 25;
@@ -67,6 +73,9 @@ public:
 
     static bool IsSupportedState(unsigned state);
 
+    // True the first time `object` is named since the device was made or reset.
+    bool FirstProblemWith(const void* object) { return m_ProblemsTold.insert(object).second; }
+
     // Statistics of the current frame, and the batch.
     unsigned GetDrawCalls() const { return m_DrawCalls; }
     unsigned GetPrimitives() const { return m_Primitives; }
@@ -94,6 +103,7 @@ private:
     CDeviceTexture* m_AppliedTarget = nullptr;
     unsigned m_DrawCalls = 0;
     unsigned m_Primitives = 0;
+    std::set<const void*> m_ProblemsTold;
 
     uint32_t m_BatchType = NoPrimitive;
     uint32_t m_BatchFormat = 0;

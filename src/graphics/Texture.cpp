@@ -147,8 +147,10 @@ bool CSurface::CreateDeviceTexture()
     IRenderBackend* backend = GetRenderBackend();
     if (!backend || !backend->HasDevice() || Width == 0 || Height == 0)
         return false;
+    // Failures are tried again at each use and logged at the first.
     if (!IsDeviceFormat(m_InternalFormat)) {
-        OX_LOG("graphics", diag::LogError, "unknown format for windows texture: %d", m_InternalFormat);
+        if (FirstDrawProblem(this))
+            OX_LOG("graphics", diag::LogError, "unknown format for windows texture: %d", m_InternalFormat);
         return false;
     }
     const uint64_t bytes = uint64_t(FormatBitsPerPixel(m_InternalFormat)) * Width * Height / 8;
@@ -157,7 +159,8 @@ bool CSurface::CreateDeviceTexture()
                   ? backend->CreateTexture(Width, Height, m_InternalFormat, (m_Flags & FlagRenderTarget) != 0)
                   : nullptr;
     if (!Surface) {
-        CheckResult(ResultOutOfVideoMemory, "Create texture", diag::LogError);
+        if (FirstDrawProblem(this))
+            CheckResult(ResultOutOfVideoMemory, "Create texture", diag::LogError);
         return false;
     }
     m_BytesInVMem = static_cast<unsigned>(bytes);
@@ -196,10 +199,13 @@ void CSurface::Unload()
 void CSurface::CreateBuffer()
 {
     OX_ASSERT(m_Buffer == 0);
-    OX_ASSERT(Width > 0);
-    OX_ASSERT(Height > 0);
-    if (m_Buffer || Width == 0 || Height == 0)
+    if (m_Buffer)
         return;
+    if (Width == 0 || Height == 0) {
+        // Its image was missing when the declarations were compiled: no pixels, and it draws nothing.
+        OX_LOG("graphics", diag::LogError, "Surface \"%s\" has no size: no pixel buffer", GetFileName());
+        return;
+    }
     GetD3DTexture();
     m_Buffer.reset(new uint32_t[static_cast<size_t>(Width) * Height]());
 }

@@ -15,8 +15,8 @@ public:
     ChunkBuffer& operator=(const ChunkBuffer&) = delete;
 
     // `size` bytes from the first block with room; a block of `chunk_size` bytes (header
-    // included) is added when none has. `size` must be at most chunk_size - kHeaderSize:
-    // otherwise the result is null.
+    // included) is added when none has. A request larger than chunk_size - kHeaderSize gets
+    // a block of its own. Null only for a size no 32-bit block holds.
     static void* Allocate(ChunkBuffer& head, size_t chunk_size, size_t size);
     static void Free(ChunkBuffer& head);
 
@@ -30,6 +30,8 @@ private:
         uint32_t size; // the whole block, header included
         uint32_t free;
     };
+    // An empty block of `bytes`, header included.
+    static Block* NewBlock(size_t bytes);
 
 public:
     static constexpr size_t kHeaderSize = sizeof(Block);

@@ -1,5 +1,6 @@
 #include "misc/StringTable.h"
 
+#include "diag/Assert.h"
 #include "diag/Log.h"
 #include "diag/Message.h"
 #include "misc/ChunkBuffer.h"
@@ -92,6 +93,7 @@ void OnStringText(void* user, XmlRecord* stack, int depth, bool)
     wstring text = Utf8ToWide(std::string_view(record.text, record.textLength));
     size_t bytes = (text.size() + 1) * sizeof(wchar);
     auto* copy = static_cast<wchar*>(load->chunks.Allocate(32768, bytes));
+    OX_CHECK_DATA(copy);
     memcpy(copy, text.c_str(), bytes);
     load->entries.emplace_back(load->currentId, copy);
     load->currentId = -1;

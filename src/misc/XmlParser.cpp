@@ -59,11 +59,16 @@ struct Reporter {
         if (!problem || !problem->what.empty())
             return;
         problem->what = what;
-        problem->line = 1 + static_cast<unsigned>(std::count(data, where, '\n'));
+        problem->line = XmlLineOf(data, where);
     }
 };
 
 } // namespace
+
+unsigned XmlLineOf(const char* data, const char* where)
+{
+    return 1 + static_cast<unsigned>(std::count(data, where, '\n'));
+}
 
 void XmlDecode(const char* text, size_t length, bool utf8, std::string& out)
 {

@@ -47,6 +47,9 @@ bool ParseXml(const char* data, size_t size, void* user, XmlElementStart onStart
               XmlAttributesDone onAttributesDone, XmlElementEnd onEnd, XmlText onText,
               XmlParseProblem* problem = nullptr);
 
+// The 1-based line of `where`, a pointer into the parsed `data` (a name in a record), for log lines.
+unsigned XmlLineOf(const char* data, const char* where);
+
 // Decodes the references in `text` as the parser does (appends to `out`).
 void XmlDecode(const char* text, size_t length, bool utf8, std::string& out);
 

@@ -75,16 +75,52 @@ TEST(ResourceDeclarations, GroupsLoadDeepestFirstAndTheFirstIdWins)
     EXPECT_EQ(*inner, 103);
 }
 
-TEST(ResourceDeclarations, NamedTargetGroupUnknownElementsAndMissingFiles)
+TEST(ResourceDeclarations, MistakesInTheFileAreLoggedAndSkipped)
 {
+    const std::string tooLong(88, 'x'), longest(87, 'y');
+    const std::string xml = "<?xml version=\"1.0\"?>\n<root>\n<font id=\"a\"/>\n"
+                            "<sprite id=\"s\"><font id=\"in_sprite\"/></sprite>\n"
+                            "<font id=\"b\"><font id=\"nested\"/><group id=\"g\"/></font>\n"
+                            "<font id=\"" + tooLong + "\" image=\"t\"/>\n"
+                            "<font id=\"c\" image=\"" + tooLong + "\"/>\n"
+                            "<group id=\"" + tooLong + "\"><font id=\"d\"/><group id=\"h\"/></group>\n"
+                            "<font id=\"d\"/><font id=\"" + longest + "\"/></root>";
+    oxtest::LogCapture log;
+    oxtest::AssertCapture asserts;
     CResourceDeclarations declarations;
-    const char* xml = "<?xml version=\"1.0\"?><root><font id=\"a\"/><sprite id=\"x\"/></root>";
-    EXPECT_CONTRACT_FAILURE(declarations.LoadFromMemory(xml, strlen(xml), "extra.xml", "extra"),
-                            "!\"unknown resource declaration element\"");
+    declarations.LoadFromMemory(xml.data(), xml.size(), "extra.xml", "extra");
+    EXPECT_EQ(asserts.Count(), 0u);
+
     ResourceGroup* extra = declarations.FindGroup("extra");
     ASSERT_NE(extra, nullptr);
-    EXPECT_EQ(extra->m_Declarations.size(), 1u);
+    EXPECT_TRUE(extra->m_Groups.empty()) << "neither the group in a font nor the one with a long id";
+    std::vector<std::string> ids;
+    for (const FontDeclaration& declaration : extra->m_Declarations)
+        ids.push_back(declaration.m_Id->str());
+    EXPECT_EQ(ids, (std::vector<std::string> {"a", "b", "d", longest})) << "a skipped \"d\" is no duplicate";
+    EXPECT_TRUE(log.Contains("extra.xml line 4: unknown element \"sprite\" skipped with its content"));
+    EXPECT_TRUE(log.Contains("extra.xml line 5: element \"font\" inside font \"b\" skipped"));
+    EXPECT_TRUE(log.Contains("extra.xml line 5: element \"group\" inside font \"b\" skipped"));
+    EXPECT_TRUE(log.Contains("extra.xml line 6: font skipped: its id \"" + tooLong.substr(0, 40)));
+    EXPECT_TRUE(log.Contains("extra.xml line 7: font skipped: its image \"" + tooLong.substr(0, 40)));
+    EXPECT_TRUE(log.Contains("extra.xml line 8: group skipped: its id \"" + tooLong.substr(0, 40)));
+    EXPECT_FALSE(log.Contains("already loaded"));
+    EXPECT_FALSE(log.Contains("in_sprite"));
 
+    // Look-ups with names no identifier holds find nothing.
+    RecordingManager manager;
+    manager.LoadGroup(declarations, nullptr);
+    EXPECT_EQ(manager.GetItem(tooLong.c_str()), nullptr);
+    EXPECT_EQ(declarations.FindGroup(tooLong.c_str()), nullptr);
+    EXPECT_NE(manager.GetItem(longest.c_str()), nullptr);
+    declarations.LoadFromMemory(xml.data(), xml.size(), "extra.xml", tooLong.c_str());
+    EXPECT_EQ(declarations.m_Groups.size(), 1u);
+    EXPECT_EQ(asserts.Count(), 0u);
+}
+
+TEST(ResourceDeclarations, MissingFilesDeclareNothing)
+{
+    CResourceDeclarations declarations;
     oxtest::TempDir dir;
     oxtest::ScopedCwd cwd(dir.Path());
     declarations.Load("properties/missing.xml", nullptr);

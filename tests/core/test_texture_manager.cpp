@@ -316,6 +316,13 @@ TEST_F(ManagerFixture, DeclaredTexturesLoadOnFirstUse)
         said += line == "texman|3|Can't create surface";
     EXPECT_EQ(said, 1u);
     EXPECT_TRUE(log.Contains("Texture \"lost\" has no image: \"img/lost.png\""));
+    // Nor a pixel buffer: logged, and the texture reads as empty.
+    oxtest::AssertCapture asserts;
+    manager.GetItem("lost")->CreateBuffer();
+    EXPECT_EQ(asserts.Count(), 0u);
+    EXPECT_EQ(lost->GetBuffer(), nullptr);
+    EXPECT_EQ(manager.GetItem("lost")->Pixel(0, 0), 0u);
+    EXPECT_TRUE(log.Contains("Surface \"img/lost.png\" has no size: no pixel buffer"));
 
     manager.UnloadAllOnDemandSurfaces();
     EXPECT_EQ(manager.GetVideoMemUsed(), 0u);

@@ -1,6 +1,8 @@
 // The render device: initial states, the state shadow, the batch and its splits, the
 // frame steps.
 #include "graphics/RenderDevice.h"
+#include "graphics/Renderer.h"
+#include "graphics/Texture.h"
 #include "support/RecordingBackend.h"
 #include "support/TestSupport.h"
 
@@ -177,4 +179,32 @@ TEST_F(DeviceFixture, FrameStepsAndTheEventQuery)
 
     backend.beginSceneResult = ResultDeviceLost;
     EXPECT_FALSE(device->BeginScene());
+}
+
+TEST(DeviceProblems, ASurfaceWithoutADeviceTextureIsReportedOncePerDevice)
+{
+    RecordingBackend* backend = nullptr;
+    std::unique_ptr<CRenderer> renderer = oxtest::MakeRecordingRenderer(backend, 64, 64, 64, 64);
+    oxtest::LogCapture log;
+    CSurface pvrtc(8, 8, 0, 9), other(8, 8, 0, 10);
+    CTexture texture(&pvrtc), second(&other);
+    auto frames = [&](int count) {
+        for (int i = 0; i < count; ++i) {
+            ASSERT_TRUE(renderer->BeginScene());
+            renderer->RenderTexture(&texture, 0.0f, 0.0f);
+            renderer->RenderTexture(&second, 8.0f, 0.0f);
+            renderer->EndScene();
+        }
+    };
+    auto told = [&](const std::string& text) {
+        auto entries = log.Entries();
+        return std::count(entries.begin(), entries.end(), "graphics|3|" + text);
+    };
+    frames(3);
+    EXPECT_EQ(told("unknown format for windows texture: 9"), 1);
+    EXPECT_EQ(told("unknown format for windows texture: 10"), 1) << "once per surface, not once in all";
+    // A new device (after a reset) tells it once more.
+    renderer->GetDevice().Init();
+    frames(2);
+    EXPECT_EQ(told("unknown format for windows texture: 9"), 2);
 }

@@ -59,6 +59,22 @@ TEST(StringTable, InPlaceTablesAreCheckedBeforeUse)
     EXPECT_EQ(wstring(table.GetString(5)), u"five") << "a refused table leaves the old one";
 }
 
+TEST(StringTable, TextsLongerThanAChunkAreKept)
+{
+    // 16,377 units and a terminator are more than a 32,768-byte chunk holds beside its header.
+    const std::string longText(16377, 'a'), longer(40000, 'b');
+    const std::string xml = "<?xml version=\"1.0\"?><strings><s id=\"1\">" + longText + "</s><s id=\"2\">short</s>" +
+                            "<s id=\"3\">" + longer + "</s></strings>";
+    oxtest::AssertCapture asserts;
+    std::vector<std::pair<int, wstring>> texts;
+    EXPECT_TRUE(CStringTable::ParseXml(xml.data(), xml.size(), "strings.xml", texts));
+    EXPECT_EQ(asserts.Count(), 0u);
+    ASSERT_EQ(texts.size(), 3u);
+    EXPECT_EQ(texts[0].second, wstring(longText.begin(), longText.end()));
+    EXPECT_EQ(texts[1].second, u"short");
+    EXPECT_EQ(texts[2].second.size(), longer.size());
+}
+
 TEST(StringTable, BinaryDumpsRoundTrip)
 {
     oxtest::TempDir dir;
