@@ -48,8 +48,11 @@ public:
     bool Char(TextWalkContext& c, const TextCharInfo& info) override
     {
         if (!SurfacePtr) {
-            // The font's texture could not be loaded: the text is drawn with nothing.
-            OX_ASSERT_A(SurfacePtr);
+            // The font's texture could not be loaded: the text is drawn with nothing, said once.
+            const void* key = c.font->Texture ? static_cast<const void*>(c.font->Texture) : c.font;
+            if (FirstDrawProblem(key))
+                OX_LOG("graphics", diag::LogError, "Font '%s' has no glyph texture: its text draws nothing",
+                       c.font->id.c_str());
             return false;
         }
         const int index = static_cast<int>(info.index);

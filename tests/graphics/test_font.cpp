@@ -2,10 +2,13 @@
 #include "core/Declaration.h"
 #include "core/FontManager.h"
 #include "graphics/Font.h"
+#include "graphics/Renderer.h"
+#include "graphics/TextRender.h"
 #include "graphics/Texture.h"
 #include "misc/GamePack.h"
 #include "misc/PackWriter.h"
 #include "misc/imagelib/ImageLib.h"
+#include "support/RecordingBackend.h"
 #include "support/TestSupport.h"
 
 #include <sys/wait.h>
@@ -15,6 +18,7 @@
 using namespace ox::graphics;
 using ox::core::CFontManager;
 using ox::wstring;
+using oxtest::RecordingBackend;
 
 namespace {
 
@@ -306,4 +310,35 @@ TEST(OxFont, MakesAFontTheEngineLoads)
     }
     EXPECT_NE(WEXITSTATUS(system((std::string(OX_OXFONT_PATH) + " --size 0 >/dev/null 2>&1").c_str())), 0);
     EXPECT_EQ(WEXITSTATUS(system((std::string(OX_OXFONT_PATH) + " --help >/dev/null").c_str())), 0);
+}
+
+TEST(FontDrawing, AFontWithoutAGlyphTextureIsReportedOncePerTexture)
+{
+    RecordingBackend* backend = nullptr;
+    std::unique_ptr<CRenderer> renderer = oxtest::MakeRecordingRenderer(backend, 64, 64, 64, 64);
+    OwnedTexture glyphs(64, 64);
+    FontBlock block;
+    ASSERT_TRUE(BuildFontBlock(kProperties, strlen(kProperties), "f", "f.xml", &glyphs.texture, block));
+    CFont font, sibling;
+    font.Attach(block.data());
+    sibling.Attach(block.data());
+    font.Texture = sibling.Texture = &glyphs.texture;
+    backend->failCreateTexture = true;
+
+    oxtest::LogCapture log;
+    const Color white(0xFFFFFFFFu), none(0u);
+    for (int frame = 0; frame < 3; ++frame) {
+        ASSERT_TRUE(renderer->BeginScene());
+        for (const CFont* f : {&font, &sibling})
+            renderer->GetTextRender().RenderText(*renderer, f, u"AV", {0, 0, 64, 32}, 0, 0, white, none, white, none,
+                                                 -1, -1);
+        renderer->EndScene();
+    }
+    auto entries = log.Entries();
+    EXPECT_EQ(std::count(entries.begin(), entries.end(), "graphics|3|Create texture failed, result: 8876017c"), 1);
+    EXPECT_EQ(std::count_if(entries.begin(), entries.end(),
+                            [](const std::string& e) { return e.find("glyph texture") != std::string::npos; }),
+              1)
+        << "two fonts on one texture";
+    EXPECT_TRUE(backend->draws.empty());
 }
