@@ -144,22 +144,26 @@ void CLua::LoadScript(const char* _script)
 std::vector<std::string> ListLuaScripts(const misc::CGamePack& pack, const char* folder)
 {
     struct Gather {
-        const char* folder;
         size_t prefix;
         std::vector<std::string> files;
-    } gather {folder, folder ? std::strlen(folder) : 0, {}};
+        unsigned behindSeparator = 0;
+    } gather {folder ? std::strlen(folder) : 0, {}};
     if (!folder)
         return {};
     pack.EnumFiles(folder, [](void* user, const char* path) {
         auto* g = static_cast<Gather*>(user);
+        // What stands behind the prefix must be a bare name: the walk doesn't go into
+        // sub-folders, and ".lua" may stand anywhere in the name.
         const char* name = path + std::min(g->prefix, std::strlen(path));
-        // The folder's own separator, when the caller left it out.
-        if (*name == '/' && g->prefix > 0 && g->folder[g->prefix - 1] != '/')
-            ++name;
-        // The walk doesn't go into sub-folders; ".lua" may stand anywhere in the name.
         if (std::strchr(name, '/') == nullptr && std::strstr(name, ".lua") != nullptr)
             g->files.emplace_back(path);
+        else if (*name == '/')
+            ++g->behindSeparator;
     }, &gather);
+    if (gather.behindSeparator > 0)
+        OX_LOG("lua", diag::LogWarning,
+               "LoadLuaScripts(\"%s\"): %u files in the folder are not loaded; a folder is named with a trailing '/'",
+               folder, gather.behindSeparator);
     return gather.files;
 }
 

@@ -304,14 +304,17 @@ TEST_F(LuaHostTest, LoadLuaScriptsTakesOnlyTheFolderItself)
     dir.Write("scripts/notes.txt", "runs = (runs or '') .. 'X'");
     dir.Write("scripts/sub/c.lua", "runs = (runs or '') .. 'c'");
     CLua lua("", false);
-    lua.LoadLuaScripts("scripts");
     lua.LoadLuaScripts("scripts/");
-    EXPECT_EQ(Eval(lua, "return runs"), "abab");
+    EXPECT_EQ(Eval(lua, "return runs"), "ab");
+    // The folder is a plain prefix: without its '/' every file in it lies behind one.
+    lua.LoadLuaScripts("scripts");
+    EXPECT_EQ(Eval(lua, "return runs"), "ab");
+    EXPECT_TRUE(LogHas("LoadLuaScripts(\"scripts\"): 3 files in the folder are not loaded"));
 
     // A pack lists the sub-folders' files too; they are skipped.
     ox::misc::CPackWriter writer;
     for (const char* path : {"scripts/a.lua", "scripts/a.lua.bak", "scripts/notes.txt", "scripts/sub/c.lua",
-                             "scriptsmore/d.lua", "other/e.lua"})
+                             "scriptsmore/d.lua", "scripts_extra.lua", "other/e.lua"})
         ASSERT_TRUE(writer.AddData(path, "x = 1"));
     std::string image;
     ASSERT_TRUE(writer.Build(image));
@@ -321,7 +324,7 @@ TEST_F(LuaHostTest, LoadLuaScriptsTakesOnlyTheFolderItself)
     ASSERT_TRUE(pack.HasPack()) << pack.PackError();
     std::vector<std::string> expected {"scripts/a.lua", "scripts/a.lua.bak"};
     EXPECT_EQ(ox::lua::ListLuaScripts(pack, "scripts/"), expected);
-    EXPECT_EQ(ox::lua::ListLuaScripts(pack, "scripts"), expected);
+    EXPECT_EQ(ox::lua::ListLuaScripts(pack, "scripts"), std::vector<std::string> {"scripts_extra.lua"});
 }
 
 TEST_F(LuaHostTest, ChangedScriptsRunAgain)
