@@ -1,7 +1,6 @@
 // The engine's Lua host.
 #include "lua/Lua.h"
 
-#include "core/TimeManager.h"
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "diag/Message.h"
@@ -211,9 +210,8 @@ CLua* CLua::GetLua(const std::string& id)
     return it == m_Luas.end() ? nullptr : it->second;
 }
 
-void CLua::StepGarbageCollector()
+void CLua::StepGarbageCollector(uint32_t now)
 {
-    uint32_t now = core::g_FrameTime;
     // Unsigned: a clock that wraps or starts again steps once and goes on from there.
     if (now - m_LastGCTime > GCPeriod) {
         m_LastGCTime = now;

@@ -55,8 +55,9 @@ public:
 
     // The host listed under `id`, or null.
     static CLua* GetLua(const std::string& id);
-    // One small collection step on every listed host, once a period of the frame clock.
-    static void StepGarbageCollector();
+    // One small collection step on every listed host, once a period; `now` is the frame
+    // time in milliseconds.
+    static void StepGarbageCollector(uint32_t now);
     static uint32_t GetLastGCTime() { return m_LastGCTime; }
 
 private:

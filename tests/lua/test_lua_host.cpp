@@ -2,7 +2,6 @@
 // reload, the garbage step and calls from native code into Lua.
 #include "lua/Lua.h"
 
-#include "core/TimeManager.h"
 #include "lua/LuaBinding.h"
 #include "lua/mluabind/StdBinding.h"
 #include "lua/LuaTestHost.h"
@@ -10,6 +9,7 @@
 #include "misc/PackWriter.h"
 #include "support/TestSupport.h"
 
+#include <algorithm>
 #include <chrono>
 #include <thread>
 
@@ -19,9 +19,13 @@ using ox::lua::CLua;
 namespace {
 
 struct Lamp {
+    // The power of every lamp that was destroyed.
+    static inline std::vector<int> Finalised;
     int Power = 0;
     Lamp() = default;
     explicit Lamp(int power) : Power(power) {}
+    Lamp(const Lamp&) = default;
+    ~Lamp() { Finalised.push_back(Power); }
     int GetPower() const { return Power; }
 };
 
@@ -103,32 +107,32 @@ TEST_F(LuaHostTest, HostsAreListedByTheirId)
 
 TEST_F(LuaHostTest, GarbageStepRunsOncePerPeriodOnListedHostsOnly)
 {
-    uint32_t saved = ox::core::g_FrameTime;
     CLua listed("test_gc", false);
     CLua anonymous("", false);
-    // Finalisers show which state collected its garbage. The automatic collector is off.
-    const char* garbage = "collectgarbage('stop') finalised = false "
-                          "for i = 1, 200 do local p = newproxy(true) getmetatable(p).__gc = function() "
-                          "finalised = true end end";
-    ASSERT_EQ(Eval(listed, garbage), "nil");
-    ASSERT_EQ(Eval(anonymous, garbage), "nil");
-    // A host that a script made and dropped: the step finalises it while going through the list.
     BindBasics(listed);
+    BindBasics(anonymous);
+    // Finalised lamps show which state collected its garbage. The automatic collector is off.
+    auto garbage = [](int power) {
+        return "collectgarbage('stop') for i = 1, 200 do game.Lamp(" + std::to_string(power) + ") end";
+    };
+    ASSERT_EQ(Eval(listed, garbage(1)), "nil");
+    ASSERT_EQ(Eval(anonymous, garbage(2)), "nil");
+    Lamp::Finalised.clear();
+    // A host that a script made and dropped: the step finalises it while going through the list.
     ASSERT_EQ(Eval(listed, "ox.lua.CLua('test_gc_dropped', false)"), "nil");
     ASSERT_NE(CLua::GetLua("test_gc_dropped"), nullptr);
 
-    ox::core::g_FrameTime = CLua::GetLastGCTime() + CLua::GCPeriod;
-    CLua::StepGarbageCollector();
-    EXPECT_EQ(CLua::GetLastGCTime(), ox::core::g_FrameTime - CLua::GCPeriod) << "the period must be exceeded";
-    for (int i = 0; i < 200 && (Eval(listed, "return finalised") == "false" || CLua::GetLua("test_gc_dropped")); ++i) {
-        ox::core::g_FrameTime += CLua::GCPeriod + 1;
-        CLua::StepGarbageCollector();
-        EXPECT_EQ(CLua::GetLastGCTime(), ox::core::g_FrameTime);
+    uint32_t now = CLua::GetLastGCTime() + CLua::GCPeriod;
+    CLua::StepGarbageCollector(now);
+    EXPECT_EQ(CLua::GetLastGCTime(), now - CLua::GCPeriod) << "the period must be exceeded";
+    for (int i = 0; i < 200 && (Lamp::Finalised.empty() || CLua::GetLua("test_gc_dropped")); ++i) {
+        now += CLua::GCPeriod + 1;
+        CLua::StepGarbageCollector(now);
+        EXPECT_EQ(CLua::GetLastGCTime(), now);
     }
-    EXPECT_EQ(Eval(listed, "return finalised"), "true");
-    EXPECT_EQ(Eval(anonymous, "return finalised"), "false");
+    EXPECT_NE(std::count(Lamp::Finalised.begin(), Lamp::Finalised.end(), 1), 0);
+    EXPECT_EQ(std::count(Lamp::Finalised.begin(), Lamp::Finalised.end(), 2), 0);
     EXPECT_EQ(CLua::GetLua("test_gc_dropped"), nullptr);
-    ox::core::g_FrameTime = saved;
 }
 
 TEST_F(LuaHostTest, RunReportsFailuresAndKeepsTheStack)
