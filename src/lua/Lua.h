@@ -62,6 +62,9 @@ public:
 
 private:
     static lua_State* NewState();
+    // Keeps scripts away from finalisers: no newproxy, the library metatables are
+    // protected, and the debug library can't reach into userdata or native functions.
+    void SealFinalisers();
     void RunScript(const char* text, size_t size, const char* _script);
 
     std::string m_Id;

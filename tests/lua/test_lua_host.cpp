@@ -31,6 +31,14 @@ struct Lamp {
 
 struct Unbound {};
 
+// Returned by value: lives on the native side while its Lua copy is being made.
+struct Probe {
+    static inline int Alive = 0;
+    Probe() { ++Alive; }
+    Probe(const Probe&) { ++Alive; }
+    ~Probe() { --Alive; }
+};
+
 struct LuaHostTest : ::testing::Test {
     oxtest::TempDir dir;
     oxtest::ScopedCwd cwd {dir.Path()};
@@ -48,7 +56,9 @@ struct LuaHostTest : ::testing::Test {
                                    .Constructor<int>()
                                    .Member("Power", &Lamp::Power)
                                    .Method("GetPower", &Lamp::GetPower))
-                     .AddFunction(mluabind::Function("Twice", [](int x) { return 2 * x; })));
+                     .AddClass(mluabind::Class<Probe>("Probe"))
+                     .AddFunction(mluabind::Function("Twice", [](int x) { return 2 * x; }))
+                     .AddFunction(mluabind::Function("MakeProbe", [] { return Probe(); })));
         lua.EndBinding();
     }
     static std::string Eval(CLua& lua, const std::string& code) { return oxtest::RunChunk(lua.GetLuaState(), code); }
@@ -184,6 +194,49 @@ TEST_F(LuaHostTest, ErrorsInsideCoroutines)
     CallLuaFunction(&lua, "Step");
     EXPECT_NE(BoxTexts("Lua Error").back().find("deep"), std::string::npos);
     EXPECT_EQ(lua_gettop(lua.GetLuaState()), 0);
+}
+
+TEST_F(LuaHostTest, ScriptsCantGiveAUserdataAFailingFinaliser)
+{
+    // Each way a script could reach the finaliser of a userdata, then garbage for it. A
+    // finaliser that raised while a bound call allocates would jump over that call's
+    // native objects.
+    const char* attacks[] = {
+        "local p = newproxy(true) getmetatable(p).__gc = fail",
+        "getmetatable(game.Lamp()).__gc = fail",
+        "__MLUABIND_LUAOPERATORCLOSURESSTORAGE['game.Lamp'].__gc = fail",
+        "debug.getmetatable(game.Lamp()).__gc = fail",
+        "debug.setmetatable(game.Lamp(), {__gc = fail})",
+        "getmetatable(io.stdout).__gc = fail io.tmpfile()",
+        "io.stdout.__index.__gc = fail io.tmpfile()",
+        "getmetatable(io.stdout).__index.__gc = fail io.tmpfile()",
+        "debug.getregistry()['FILE*'].__gc = fail io.tmpfile()",
+        "debug.setfenv(io.tmpfile(), setmetatable({}, {__index = fail}))",
+        "local env = debug.getfenv(io.open) env.__close = nil setmetatable(env, {__index = fail}) io.tmpfile()",
+        "local _, dir = lfs.dir('.') getmetatable(dir).__gc = fail lfs.dir('.')",
+        "debug.getupvalue(debug.setmetatable, 1)(game.Lamp(), {__gc = fail})",
+    };
+    Probe::Alive = 0;
+    {
+        CLua lua("", false);
+        BindBasics(lua);
+        ASSERT_TRUE(lua.Run("failures = 0 function fail() failures = failures + 1 error('finaliser fails') end"));
+        for (const char* attack : attacks) {
+            lua.Run(std::string("pcall(function() ") + attack + " end)");
+            EXPECT_TRUE(lua.Run("for i = 1, 3000 do game.MakeProbe() end collectgarbage()")) << attack;
+        }
+        EXPECT_EQ(Eval(lua, "return failures"), "0");
+        EXPECT_EQ(Eval(lua, "local f = io.tmpfile() f:write('kept') f:seek('set') return f:read('*a')"), "kept");
+        // Writes to a protected metatable are reported, and change nothing.
+        EXPECT_EQ(BoxTexts("Lua Error").front(),
+                  "MetaOperatorNewIndex: error - the metatable of game.Lamp is read-only ('__gc' can't be set).\n");
+        EXPECT_EQ(Eval(lua, "return __MLUABIND_LUAOPERATORCLOSURESSTORAGE['game.Lamp'] == getmetatable(game.Lamp())"),
+                  "true");
+        Lamp::Finalised.clear();
+        EXPECT_EQ(Eval(lua, "game.Lamp(7) collectgarbage() collectgarbage()"), "nil");
+        EXPECT_EQ(std::count(Lamp::Finalised.begin(), Lamp::Finalised.end(), 7), 1) << "the real finaliser stays";
+    }
+    EXPECT_EQ(Probe::Alive, 0) << "every native object of every call was destroyed";
 }
 
 TEST_F(LuaHostTest, CallLuaFunctionPushesEachArgumentKind)
