@@ -150,7 +150,7 @@ void CApplication::Update()
     }
     m_FrameLimiter.Wait();
     graphics::SetFrameNumber(graphics::GetFrameNumber() + 1);
-    lua::CLua::StepGarbageCollector();
+    lua::CLua::StepGarbageCollector(g_FrameTime);
     GetTimeManager().Update();
     CTextureManager::Instance().UpdatePreload();
     DoUpdate();

@@ -114,7 +114,7 @@ bool CApp::Init()
     // records before scripts/main.lua; after show_fps the particle and clip declarations;
     // after the textures the sound declarations; after the fonts the quest data and the edit
     // widget's forbidden characters.
-    lua::SetLuaHeapSize(0xA00000);
+    lua::SetLuaHeapSize(0x1400000);
     m_Adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
     SetSystemIntegration(m_Adapter.get());
     LimitFPS(50);

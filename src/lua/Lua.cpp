@@ -1,7 +1,6 @@
 // The engine's Lua host.
 #include "lua/Lua.h"
 
-#include "core/TimeManager.h"
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "diag/Message.h"
@@ -31,6 +30,61 @@ constexpr size_t kReportCapacity = 65535;
 // Compiled chunks are never loaded: the undump of Lua 5.1 trusts its input.
 bool IsPrecompiled(const char* text, size_t size) { return size > 0 && text[0] == LUA_SIGNATURE[0]; }
 
+// A debug function (upvalue 1, named by upvalue 2) that refuses userdata and native
+// functions: their metatables, environments and upvalues lead to finalisers.
+int RefuseNative(lua_State* L)
+{
+    if (lua_type(L, 1) == LUA_TUSERDATA || lua_iscfunction(L, 1))
+        return luaL_error(L, "%s: not for userdata or native functions", lua_tostring(L, lua_upvalueindex(2)));
+    lua_pushvalue(L, lua_upvalueindex(1));
+    lua_insert(L, 1);
+    lua_call(L, lua_gettop(L) - 1, LUA_MULTRET);
+    return lua_gettop(L);
+}
+
+// A metatable that is its own __index (as the one of files) would hand itself out to
+// every script through that field: it gets a copy of its fields as method table instead.
+void DetachSelfIndex(lua_State* L, int mt)
+{
+    lua_getfield(L, mt, "__index");
+    bool self = lua_rawequal(L, -1, mt);
+    lua_pop(L, 1);
+    if (!self)
+        return;
+    lua_newtable(L);
+    lua_pushnil(L);
+    while (lua_next(L, mt)) {
+        lua_pushvalue(L, -2);
+        lua_insert(L, -2);
+        lua_rawset(L, -4);
+    }
+    lua_pushnil(L);
+    lua_setfield(L, -2, "__index");
+    lua_setfield(L, mt, "__index");
+}
+
+void GuardDebugLibrary(lua_State* L)
+{
+    lua_getglobal(L, "debug");
+    if (!lua_istable(L, -1)) {
+        lua_pop(L, 1);
+        return;
+    }
+    int debug = lua_gettop(L);
+    lua_pushnil(L);
+    lua_setfield(L, debug, "getregistry");
+    // Honours a protected metatable, as getmetatable does.
+    lua_getglobal(L, "getmetatable");
+    lua_setfield(L, debug, "getmetatable");
+    for (const char* name : {"getfenv", "setfenv", "getupvalue", "setupvalue", "setmetatable"}) {
+        lua_getfield(L, debug, name);
+        lua_pushfstring(L, "debug.%s", name);
+        lua_pushcclosure(L, &RefuseNative, 2);
+        lua_setfield(L, debug, name);
+    }
+    lua_pop(L, 1);
+}
+
 } // namespace
 
 lua_State* CLua::NewState()
@@ -50,12 +104,36 @@ CLua::CLua(const std::string& id, bool watch_files) : CHost(NewState(), false), 
     luaL_openlibs(L);
     lua_pushcfunction(L, &luaopen_lfs);
     lua_call(L, 0, 0);
+    SealFinalisers();
     if (!m_Id.empty()) {
         auto f = m_Luas.find(m_Id);
         OX_ASSERT(f==m_Luas.end());
         if (f == m_Luas.end())
             m_Luas.emplace(m_Id, this);
     }
+}
+
+void CLua::SealFinalisers()
+{
+    // Every userdata a script can make gets its finaliser from a protected metatable.
+    lua_pushnil(L);
+    lua_setglobal(L, "newproxy");
+    lua_pushnil(L);
+    while (lua_next(L, LUA_REGISTRYINDEX)) {
+        if (lua_type(L, -2) == LUA_TSTRING && lua_istable(L, -1)) {
+            lua_getfield(L, -1, "__gc");
+            lua_getfield(L, -2, "__metatable");
+            bool unprotected = !lua_isnil(L, -2) && lua_isnil(L, -1);
+            lua_pop(L, 2);
+            if (unprotected) {
+                DetachSelfIndex(L, lua_gettop(L));
+                ProtectMetatable(-1, lua_tostring(L, -2));
+                lua_pop(L, 1);
+            }
+        }
+        lua_pop(L, 1);
+    }
+    GuardDebugLibrary(L);
 }
 
 CLua::~CLua()
@@ -144,22 +222,26 @@ void CLua::LoadScript(const char* _script)
 std::vector<std::string> ListLuaScripts(const misc::CGamePack& pack, const char* folder)
 {
     struct Gather {
-        const char* folder;
         size_t prefix;
         std::vector<std::string> files;
-    } gather {folder, folder ? std::strlen(folder) : 0, {}};
+        unsigned behindSeparator = 0;
+    } gather {folder ? std::strlen(folder) : 0, {}};
     if (!folder)
         return {};
     pack.EnumFiles(folder, [](void* user, const char* path) {
         auto* g = static_cast<Gather*>(user);
+        // What stands behind the prefix must be a bare name: the walk doesn't go into
+        // sub-folders, and ".lua" may stand anywhere in the name.
         const char* name = path + std::min(g->prefix, std::strlen(path));
-        // The folder's own separator, when the caller left it out.
-        if (*name == '/' && g->prefix > 0 && g->folder[g->prefix - 1] != '/')
-            ++name;
-        // The walk doesn't go into sub-folders; ".lua" may stand anywhere in the name.
         if (std::strchr(name, '/') == nullptr && std::strstr(name, ".lua") != nullptr)
             g->files.emplace_back(path);
+        else if (*name == '/')
+            ++g->behindSeparator;
     }, &gather);
+    if (gather.behindSeparator > 0)
+        OX_LOG("lua", diag::LogWarning,
+               "LoadLuaScripts(\"%s\"): %u files in the folder are not loaded; a folder is named with a trailing '/'",
+               folder, gather.behindSeparator);
     return gather.files;
 }
 
@@ -207,9 +289,8 @@ CLua* CLua::GetLua(const std::string& id)
     return it == m_Luas.end() ? nullptr : it->second;
 }
 
-void CLua::StepGarbageCollector()
+void CLua::StepGarbageCollector(uint32_t now)
 {
-    uint32_t now = core::g_FrameTime;
     // Unsigned: a clock that wraps or starts again steps once and goes on from there.
     if (now - m_LastGCTime > GCPeriod) {
         m_LastGCTime = now;

@@ -40,7 +40,9 @@ public:
 
     // Loads and runs a pack file (pack path, forward slashes) and watches it.
     void LoadScript(const char* _script);
-    // LoadScript for every file directly in a pack folder whose name holds ".lua".
+    // LoadScript for every file directly in a pack folder whose name holds ".lua". The
+    // folder is a text prefix with its trailing '/' ("scripts/"): without it the files of
+    // the folder lie behind a separator and none is loaded (a warning says so).
     void LoadLuaScripts(const char* folder);
     // Compiles and runs a chunk of text; false (after a report) when either fails.
     bool Run(const std::string& code);
@@ -53,12 +55,16 @@ public:
 
     // The host listed under `id`, or null.
     static CLua* GetLua(const std::string& id);
-    // One small collection step on every listed host, once a period of the frame clock.
-    static void StepGarbageCollector();
+    // One small collection step on every listed host, once a period; `now` is the frame
+    // time in milliseconds.
+    static void StepGarbageCollector(uint32_t now);
     static uint32_t GetLastGCTime() { return m_LastGCTime; }
 
 private:
     static lua_State* NewState();
+    // Keeps scripts away from finalisers: no newproxy, the library metatables are
+    // protected, and the debug library can't reach into userdata or native functions.
+    void SealFinalisers();
     void RunScript(const char* text, size_t size, const char* _script);
 
     std::string m_Id;
@@ -68,8 +74,8 @@ private:
     static uint32_t m_LastGCTime;
 };
 
-// The scripts LoadLuaScripts runs: the files directly in `folder` (not in its sub-folders)
-// whose name holds ".lua" anywhere, in the pack's order.
+// The scripts LoadLuaScripts runs: the files whose path is `folder` followed by a name
+// without '/' that holds ".lua" anywhere, in the pack's order.
 std::vector<std::string> ListLuaScripts(const misc::CGamePack& pack, const char* folder);
 
 // --- calling Lua functions from native code ---

@@ -12,6 +12,7 @@
 
 namespace ox::lua {
 
+static_assert(CLuaHeap::HeaderSize == 24, "five 32-bit offsets padded to 8 bytes");
 static_assert(CLuaHeap::HeaderSize % CLuaHeap::Granularity == 0, "payloads must stay aligned to 8");
 
 namespace {
@@ -22,18 +23,14 @@ constexpr size_t RoundUp(size_t size) { return (size + CLuaHeap::Granularity - 1
 
 CLuaHeap::CLuaHeap(size_t size, Exhaustion exhaustion) : m_Exhaustion(exhaustion)
 {
-    size &= ~(Granularity - 1);
+    size = std::min(size, MaxArenaSize) & ~(Granularity - 1);
     m_Size = std::max(size, 2 * HeaderSize + Granularity);
     m_Memory = static_cast<uint8_t*>(::operator new(m_Size, std::align_val_t(16)));
     m_First = reinterpret_cast<Block*>(m_Memory);
     m_End = reinterpret_cast<Block*>(m_Memory + m_Size - HeaderSize);
-    m_First->Prev = nullptr;
-    m_First->Next = m_End;
-    m_First->Size = (m_Size - 2 * HeaderSize) | FreeFlag;
-    m_End->Prev = m_First;
-    m_End->Next = nullptr;
-    m_End->Size = FreeFlag; // stays "free" and on no list
-    m_End->NextFree = m_End->PrevFree = nullptr;
+    *m_First = {None, OffsetOf(m_End), static_cast<uint32_t>(m_Size - 2 * HeaderSize) | FreeFlag, None, None, 0};
+    // The end marker stays "free" and on no list.
+    *m_End = {OffsetOf(m_First), None, FreeFlag, None, None, 0};
     Link(m_First);
 }
 
@@ -53,22 +50,22 @@ CLuaHeap::Block*& CLuaHeap::ListFor(size_t size) { return size < LargeSize ? m_B
 void CLuaHeap::Link(Block* block)
 {
     Block*& head = ListFor(SizeOf(block));
-    block->PrevFree = nullptr;
-    block->NextFree = head;
+    block->PrevFree = None;
+    block->NextFree = OffsetOf(head);
     if (head)
-        head->PrevFree = block;
+        head->PrevFree = OffsetOf(block);
     head = block;
 }
 
 void CLuaHeap::Unlink(Block* block)
 {
-    if (block->PrevFree)
-        block->PrevFree->NextFree = block->NextFree;
+    if (Block* prev = At(block->PrevFree))
+        prev->NextFree = block->NextFree;
     else
-        ListFor(SizeOf(block)) = block->NextFree;
-    if (block->NextFree)
-        block->NextFree->PrevFree = block->PrevFree;
-    block->NextFree = block->PrevFree = nullptr;
+        ListFor(SizeOf(block)) = At(block->NextFree);
+    if (Block* next = At(block->NextFree))
+        next->PrevFree = block->PrevFree;
+    block->NextFree = block->PrevFree = None;
 }
 
 void* CLuaHeap::Take(Block* block, size_t size, bool split)
@@ -77,15 +74,14 @@ void* CLuaHeap::Take(Block* block, size_t size, bool split)
     size_t available = SizeOf(block);
     if (split && available >= size + SplitReserve) {
         auto* rest = reinterpret_cast<Block*>(static_cast<uint8_t*>(PayloadOf(block)) + size);
-        rest->Prev = block;
-        rest->Next = block->Next;
-        block->Next->Prev = rest;
-        block->Next = rest;
-        rest->Size = (available - size - HeaderSize) | FreeFlag;
+        *rest = {OffsetOf(block), block->Next, static_cast<uint32_t>(available - size - HeaderSize) | FreeFlag, None,
+                 None, 0};
+        At(block->Next)->Prev = OffsetOf(rest);
+        block->Next = OffsetOf(rest);
         Link(rest);
-        block->Size = size;
+        block->Size = static_cast<uint32_t>(size);
     } else {
-        block->Size = available;
+        block->Size = static_cast<uint32_t>(available);
     }
     m_Used += SizeOf(block) + HeaderSize;
     return PayloadOf(block);
@@ -104,7 +100,7 @@ void* CLuaHeap::Allocate(size_t size)
         if (m_Bins[i])
             return Take(m_Bins[i], size, false);
     // First fit among the large blocks, then any bigger bin; both split.
-    for (Block* block = m_Large; block; block = block->NextFree)
+    for (Block* block = m_Large; block; block = At(block->NextFree))
         if (SizeOf(block) >= size)
             return Take(block, size, true);
     for (size_t i = bin + 3; i < BinCount; ++i)
@@ -124,21 +120,21 @@ void CLuaHeap::Free(void* pointer)
     m_Used -= SizeOf(block) + HeaderSize;
     block->Size |= FreeFlag;
     for (;;) {
-        Block* prev = block->Prev;
+        Block* prev = At(block->Prev);
         if (prev && IsFree(prev)) {
             Unlink(prev);
-            prev->Size = (SizeOf(prev) + SizeOf(block) + HeaderSize) | FreeFlag;
+            prev->Size = static_cast<uint32_t>(SizeOf(prev) + SizeOf(block) + HeaderSize) | FreeFlag;
             prev->Next = block->Next;
-            block->Next->Prev = prev;
+            At(block->Next)->Prev = OffsetOf(prev);
             block = prev;
             continue;
         }
-        Block* next = block->Next;
+        Block* next = At(block->Next);
         if (IsFree(next) && !IsEndMarker(next)) {
             Unlink(next);
-            block->Size = (SizeOf(block) + SizeOf(next) + HeaderSize) | FreeFlag;
+            block->Size = static_cast<uint32_t>(SizeOf(block) + SizeOf(next) + HeaderSize) | FreeFlag;
             block->Next = next->Next;
-            next->Next->Prev = block;
+            At(next->Next)->Prev = OffsetOf(block);
             continue;
         }
         Link(block);
@@ -193,10 +189,10 @@ bool CLuaHeap::Check() const
     const Block* prev = nullptr;
     const Block* block = m_First;
     while (block != m_End) {
-        if (!block || block->Prev != prev)
+        if (!block || block->Prev != OffsetOf(prev))
             return false;
         const uint8_t* end = reinterpret_cast<const uint8_t*>(block) + HeaderSize + SizeOf(block);
-        if (reinterpret_cast<const uint8_t*>(block->Next) != end || end > reinterpret_cast<const uint8_t*>(m_End))
+        if (reinterpret_cast<const uint8_t*>(At(block->Next)) != end || end > reinterpret_cast<const uint8_t*>(m_End))
             return false;
         if (IsFree(block)) {
             // Neighbours that are both free should have joined.
@@ -207,17 +203,17 @@ bool CLuaHeap::Check() const
             used += SizeOf(block) + HeaderSize;
         }
         prev = block;
-        block = block->Next;
+        block = At(block->Next);
     }
-    if (m_End->Prev != prev || m_End->Next || m_End->Size != FreeFlag)
+    if (m_End->Prev != OffsetOf(prev) || m_End->Next != None || m_End->Size != FreeFlag)
         return false;
     if (used != m_Used)
         return false;
     size_t listed = 0;
     auto check_list = [&](const Block* head, size_t bin, bool large) {
         const Block* before = nullptr;
-        for (const Block* b = head; b; b = b->NextFree) {
-            if (!IsFree(b) || b->PrevFree != before || b == m_End)
+        for (const Block* b = head; b; b = At(b->NextFree)) {
+            if (!IsFree(b) || b->PrevFree != OffsetOf(before) || b == m_End)
                 return false;
             if (large ? SizeOf(b) < LargeSize : SizeOf(b) != bin * Granularity)
                 return false;
@@ -238,9 +234,9 @@ size_t CLuaHeap::FreeBlockCount() const
 {
     size_t count = 0;
     for (unsigned i = 0; i < BinCount; ++i)
-        for (const Block* b = m_Bins[i]; b; b = b->NextFree)
+        for (const Block* b = m_Bins[i]; b; b = At(b->NextFree))
             ++count;
-    for (const Block* b = m_Large; b; b = b->NextFree)
+    for (const Block* b = m_Large; b; b = At(b->NextFree))
         ++count;
     return count;
 }

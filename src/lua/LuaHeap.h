@@ -1,10 +1,11 @@
 #pragma once
 // The fixed arena from which every Lua state allocates.
 //
-// Blocks lie in address order, each behind a header (previous and next block, size with
-// the top bit as "free" flag, next and previous free block); the size excludes the header.
-// Free blocks of 8*i bytes below 1024 sit in bin i, bigger ones in one large list; new
-// free blocks go to the head of their list. The last header is an end marker of size 0.
+// Blocks lie in address order, each behind a header of five 32-bit offsets into the arena
+// (previous and next block, size with the top bit as "free" flag, next and previous free
+// block) padded to 8 bytes; the size excludes the header. Free blocks of 8*i bytes below
+// 1024 sit in bin i, bigger ones in one large list; new free blocks go to the head of
+// their list. The last header is an end marker of size 0.
 #include <cstddef>
 #include <cstdint>
 
@@ -12,13 +13,16 @@ namespace ox::lua {
 
 class CLuaHeap {
 public:
+    // Links are offsets from the start of the arena; None stands for no block.
     struct Block {
-        Block* Prev;
-        Block* Next;
-        size_t Size;
-        Block* NextFree;
-        Block* PrevFree;
+        uint32_t Prev;
+        uint32_t Next;
+        uint32_t Size;
+        uint32_t NextFree;
+        uint32_t PrevFree;
+        uint32_t Padding;
     };
+    static constexpr uint32_t None = UINT32_MAX;
 
     static constexpr size_t HeaderSize = sizeof(Block);
     static constexpr size_t Granularity = 8;
@@ -26,13 +30,16 @@ public:
     static constexpr unsigned BinCount = LargeSize / Granularity;
     // A block is split only when the rest can hold a header and at least 8 bytes.
     static constexpr size_t SplitReserve = HeaderSize + Granularity;
-    static constexpr size_t FreeFlag = size_t(1) << (sizeof(size_t) * 8 - 1);
+    static constexpr uint32_t FreeFlag = uint32_t(1) << 31;
+    // Sizes and offsets stay below the free flag.
+    static constexpr size_t MaxArenaSize = FreeFlag - Granularity;
 
     // What an exhausted arena does: give null to the caller, or stop the process with a
     // message (the process-wide heap of the Lua states).
     enum class Exhaustion { ReturnNull, StopProcess };
 
-    // An arena of `size` bytes (rounded down to a multiple of 8; at least two headers).
+    // An arena of `size` bytes (rounded down to a multiple of 8; at least two headers, at
+    // most MaxArenaSize).
     explicit CLuaHeap(size_t size, Exhaustion exhaustion = Exhaustion::ReturnNull);
     ~CLuaHeap();
     CLuaHeap(const CLuaHeap&) = delete;
@@ -65,6 +72,11 @@ private:
     static Block* BlockOf(const void* pointer);
     static void* PayloadOf(Block* block);
     bool IsEndMarker(const Block* block) const { return block == m_End; }
+    Block* At(uint32_t offset) const { return offset == None ? nullptr : reinterpret_cast<Block*>(m_Memory + offset); }
+    uint32_t OffsetOf(const Block* block) const
+    {
+        return block ? static_cast<uint32_t>(reinterpret_cast<const uint8_t*>(block) - m_Memory) : None;
+    }
 
     Block*& ListFor(size_t size);
     void Link(Block* block);

@@ -23,7 +23,7 @@ CLuaHeap ArenaWithFreeBlock(size_t free_size) { return CLuaHeap(free_size + 2 * 
 
 TEST(LuaHeap, BlocksSplitFromOneArenaWithRealHeaders)
 {
-    EXPECT_EQ(H, 5 * sizeof(void*));
+    EXPECT_EQ(H, 24u);
     CLuaHeap heap(4096);
     EXPECT_EQ(heap.FreeBlockCount(), 1u);
     void* a = heap.Allocate(100);
@@ -199,4 +199,32 @@ TEST(LuaHeap, LuaStateOnASmallArena)
     lua_close(L);
     EXPECT_EQ(heap.GetUsed(), 0u);
     EXPECT_TRUE(heap.Check());
+}
+
+TEST(LuaHeap, SmallTablesFillTheArenaAtTwentyFourBytesABlock)
+{
+    // Each link of the chain is a table (64 bytes on 64-bit) with an array part of one
+    // value (16 bytes): two blocks of 80 payload bytes and two 24-byte headers.
+    constexpr size_t arena = 2 * 1024 * 1024;
+    constexpr size_t perTable = 64 + 16 + 2 * 24;
+    CLuaHeap heap(arena);
+    lua_State* L = lua_newstate(&CLuaHeap::LuaAlloc, &heap);
+    ASSERT_NE(L, nullptr);
+    ASSERT_EQ(luaL_loadstring(L, "local chain chain = {chain} count = 0 while true do chain = {chain} count = count + 1 end"),
+              0);
+    size_t before = heap.GetUsed();
+    EXPECT_EQ(lua_pcall(L, 0, 0, 0), LUA_ERRMEM);
+    lua_getglobal(L, "count");
+    double count = lua_tonumber(L, -1);
+    double expected = double(arena - before) / perTable;
+    EXPECT_NEAR(count, expected, expected / 100);
+    lua_close(L);
+    EXPECT_EQ(heap.GetUsed(), 0u);
+}
+
+TEST(LuaHeapDeathTest, ExhaustionStopsTheProcessWithTheBytesInUse)
+{
+    CLuaHeap heap(4096, CLuaHeap::Exhaustion::StopProcess);
+    ASSERT_NE(heap.Allocate(1000), nullptr);
+    EXPECT_DEATH(heap.Allocate(8000), "Lua heap exhausted: 8000 bytes requested, 1024 of 4096 bytes in use");
 }

@@ -2,7 +2,6 @@
 // reload, the garbage step and calls from native code into Lua.
 #include "lua/Lua.h"
 
-#include "core/TimeManager.h"
 #include "lua/LuaBinding.h"
 #include "lua/mluabind/StdBinding.h"
 #include "lua/LuaTestHost.h"
@@ -10,6 +9,7 @@
 #include "misc/PackWriter.h"
 #include "support/TestSupport.h"
 
+#include <algorithm>
 #include <chrono>
 #include <thread>
 
@@ -19,13 +19,25 @@ using ox::lua::CLua;
 namespace {
 
 struct Lamp {
+    // The power of every lamp that was destroyed.
+    static inline std::vector<int> Finalised;
     int Power = 0;
     Lamp() = default;
     explicit Lamp(int power) : Power(power) {}
+    Lamp(const Lamp&) = default;
+    ~Lamp() { Finalised.push_back(Power); }
     int GetPower() const { return Power; }
 };
 
 struct Unbound {};
+
+// Returned by value: lives on the native side while its Lua copy is being made.
+struct Probe {
+    static inline int Alive = 0;
+    Probe() { ++Alive; }
+    Probe(const Probe&) { ++Alive; }
+    ~Probe() { --Alive; }
+};
 
 struct LuaHostTest : ::testing::Test {
     oxtest::TempDir dir;
@@ -44,7 +56,9 @@ struct LuaHostTest : ::testing::Test {
                                    .Constructor<int>()
                                    .Member("Power", &Lamp::Power)
                                    .Method("GetPower", &Lamp::GetPower))
-                     .AddFunction(mluabind::Function("Twice", [](int x) { return 2 * x; })));
+                     .AddClass(mluabind::Class<Probe>("Probe"))
+                     .AddFunction(mluabind::Function("Twice", [](int x) { return 2 * x; }))
+                     .AddFunction(mluabind::Function("MakeProbe", [] { return Probe(); })));
         lua.EndBinding();
     }
     static std::string Eval(CLua& lua, const std::string& code) { return oxtest::RunChunk(lua.GetLuaState(), code); }
@@ -103,32 +117,32 @@ TEST_F(LuaHostTest, HostsAreListedByTheirId)
 
 TEST_F(LuaHostTest, GarbageStepRunsOncePerPeriodOnListedHostsOnly)
 {
-    uint32_t saved = ox::core::g_FrameTime;
     CLua listed("test_gc", false);
     CLua anonymous("", false);
-    // Finalisers show which state collected its garbage. The automatic collector is off.
-    const char* garbage = "collectgarbage('stop') finalised = false "
-                          "for i = 1, 200 do local p = newproxy(true) getmetatable(p).__gc = function() "
-                          "finalised = true end end";
-    ASSERT_EQ(Eval(listed, garbage), "nil");
-    ASSERT_EQ(Eval(anonymous, garbage), "nil");
-    // A host that a script made and dropped: the step finalises it while going through the list.
     BindBasics(listed);
+    BindBasics(anonymous);
+    // Finalised lamps show which state collected its garbage. The automatic collector is off.
+    auto garbage = [](int power) {
+        return "collectgarbage('stop') for i = 1, 200 do game.Lamp(" + std::to_string(power) + ") end";
+    };
+    ASSERT_EQ(Eval(listed, garbage(1)), "nil");
+    ASSERT_EQ(Eval(anonymous, garbage(2)), "nil");
+    Lamp::Finalised.clear();
+    // A host that a script made and dropped: the step finalises it while going through the list.
     ASSERT_EQ(Eval(listed, "ox.lua.CLua('test_gc_dropped', false)"), "nil");
     ASSERT_NE(CLua::GetLua("test_gc_dropped"), nullptr);
 
-    ox::core::g_FrameTime = CLua::GetLastGCTime() + CLua::GCPeriod;
-    CLua::StepGarbageCollector();
-    EXPECT_EQ(CLua::GetLastGCTime(), ox::core::g_FrameTime - CLua::GCPeriod) << "the period must be exceeded";
-    for (int i = 0; i < 200 && (Eval(listed, "return finalised") == "false" || CLua::GetLua("test_gc_dropped")); ++i) {
-        ox::core::g_FrameTime += CLua::GCPeriod + 1;
-        CLua::StepGarbageCollector();
-        EXPECT_EQ(CLua::GetLastGCTime(), ox::core::g_FrameTime);
+    uint32_t now = CLua::GetLastGCTime() + CLua::GCPeriod;
+    CLua::StepGarbageCollector(now);
+    EXPECT_EQ(CLua::GetLastGCTime(), now - CLua::GCPeriod) << "the period must be exceeded";
+    for (int i = 0; i < 200 && (Lamp::Finalised.empty() || CLua::GetLua("test_gc_dropped")); ++i) {
+        now += CLua::GCPeriod + 1;
+        CLua::StepGarbageCollector(now);
+        EXPECT_EQ(CLua::GetLastGCTime(), now);
     }
-    EXPECT_EQ(Eval(listed, "return finalised"), "true");
-    EXPECT_EQ(Eval(anonymous, "return finalised"), "false");
+    EXPECT_NE(std::count(Lamp::Finalised.begin(), Lamp::Finalised.end(), 1), 0);
+    EXPECT_EQ(std::count(Lamp::Finalised.begin(), Lamp::Finalised.end(), 2), 0);
     EXPECT_EQ(CLua::GetLua("test_gc_dropped"), nullptr);
-    ox::core::g_FrameTime = saved;
 }
 
 TEST_F(LuaHostTest, RunReportsFailuresAndKeepsTheStack)
@@ -180,6 +194,49 @@ TEST_F(LuaHostTest, ErrorsInsideCoroutines)
     CallLuaFunction(&lua, "Step");
     EXPECT_NE(BoxTexts("Lua Error").back().find("deep"), std::string::npos);
     EXPECT_EQ(lua_gettop(lua.GetLuaState()), 0);
+}
+
+TEST_F(LuaHostTest, ScriptsCantGiveAUserdataAFailingFinaliser)
+{
+    // Each way a script could reach the finaliser of a userdata, then garbage for it. A
+    // finaliser that raised while a bound call allocates would jump over that call's
+    // native objects.
+    const char* attacks[] = {
+        "local p = newproxy(true) getmetatable(p).__gc = fail",
+        "getmetatable(game.Lamp()).__gc = fail",
+        "__MLUABIND_LUAOPERATORCLOSURESSTORAGE['game.Lamp'].__gc = fail",
+        "debug.getmetatable(game.Lamp()).__gc = fail",
+        "debug.setmetatable(game.Lamp(), {__gc = fail})",
+        "getmetatable(io.stdout).__gc = fail io.tmpfile()",
+        "io.stdout.__index.__gc = fail io.tmpfile()",
+        "getmetatable(io.stdout).__index.__gc = fail io.tmpfile()",
+        "debug.getregistry()['FILE*'].__gc = fail io.tmpfile()",
+        "debug.setfenv(io.tmpfile(), setmetatable({}, {__index = fail}))",
+        "local env = debug.getfenv(io.open) env.__close = nil setmetatable(env, {__index = fail}) io.tmpfile()",
+        "local _, dir = lfs.dir('.') getmetatable(dir).__gc = fail lfs.dir('.')",
+        "debug.getupvalue(debug.setmetatable, 1)(game.Lamp(), {__gc = fail})",
+    };
+    Probe::Alive = 0;
+    {
+        CLua lua("", false);
+        BindBasics(lua);
+        ASSERT_TRUE(lua.Run("failures = 0 function fail() failures = failures + 1 error('finaliser fails') end"));
+        for (const char* attack : attacks) {
+            lua.Run(std::string("pcall(function() ") + attack + " end)");
+            EXPECT_TRUE(lua.Run("for i = 1, 3000 do game.MakeProbe() end collectgarbage()")) << attack;
+        }
+        EXPECT_EQ(Eval(lua, "return failures"), "0");
+        EXPECT_EQ(Eval(lua, "local f = io.tmpfile() f:write('kept') f:seek('set') return f:read('*a')"), "kept");
+        // Writes to a protected metatable are reported, and change nothing.
+        EXPECT_EQ(BoxTexts("Lua Error").front(),
+                  "MetaOperatorNewIndex: error - the metatable of game.Lamp is read-only ('__gc' can't be set).\n");
+        EXPECT_EQ(Eval(lua, "return __MLUABIND_LUAOPERATORCLOSURESSTORAGE['game.Lamp'] == getmetatable(game.Lamp())"),
+                  "true");
+        Lamp::Finalised.clear();
+        EXPECT_EQ(Eval(lua, "game.Lamp(7) collectgarbage() collectgarbage()"), "nil");
+        EXPECT_EQ(std::count(Lamp::Finalised.begin(), Lamp::Finalised.end(), 7), 1) << "the real finaliser stays";
+    }
+    EXPECT_EQ(Probe::Alive, 0) << "every native object of every call was destroyed";
 }
 
 TEST_F(LuaHostTest, CallLuaFunctionPushesEachArgumentKind)
@@ -304,14 +361,17 @@ TEST_F(LuaHostTest, LoadLuaScriptsTakesOnlyTheFolderItself)
     dir.Write("scripts/notes.txt", "runs = (runs or '') .. 'X'");
     dir.Write("scripts/sub/c.lua", "runs = (runs or '') .. 'c'");
     CLua lua("", false);
-    lua.LoadLuaScripts("scripts");
     lua.LoadLuaScripts("scripts/");
-    EXPECT_EQ(Eval(lua, "return runs"), "abab");
+    EXPECT_EQ(Eval(lua, "return runs"), "ab");
+    // The folder is a plain prefix: without its '/' every file in it lies behind one.
+    lua.LoadLuaScripts("scripts");
+    EXPECT_EQ(Eval(lua, "return runs"), "ab");
+    EXPECT_TRUE(LogHas("LoadLuaScripts(\"scripts\"): 3 files in the folder are not loaded"));
 
     // A pack lists the sub-folders' files too; they are skipped.
     ox::misc::CPackWriter writer;
     for (const char* path : {"scripts/a.lua", "scripts/a.lua.bak", "scripts/notes.txt", "scripts/sub/c.lua",
-                             "scriptsmore/d.lua", "other/e.lua"})
+                             "scriptsmore/d.lua", "scripts_extra.lua", "other/e.lua"})
         ASSERT_TRUE(writer.AddData(path, "x = 1"));
     std::string image;
     ASSERT_TRUE(writer.Build(image));
@@ -321,7 +381,7 @@ TEST_F(LuaHostTest, LoadLuaScriptsTakesOnlyTheFolderItself)
     ASSERT_TRUE(pack.HasPack()) << pack.PackError();
     std::vector<std::string> expected {"scripts/a.lua", "scripts/a.lua.bak"};
     EXPECT_EQ(ox::lua::ListLuaScripts(pack, "scripts/"), expected);
-    EXPECT_EQ(ox::lua::ListLuaScripts(pack, "scripts"), expected);
+    EXPECT_EQ(ox::lua::ListLuaScripts(pack, "scripts"), std::vector<std::string> {"scripts_extra.lua"});
 }
 
 TEST_F(LuaHostTest, ChangedScriptsRunAgain)

@@ -181,9 +181,15 @@ TEST_F(Classes, EnumeratorsAndConstants)
     // Constants of a base show through the derived class's table.
     EXPECT_EQ(host.Run("return game.Button.FlagHidden"), "1");
     EXPECT_EQ(host.Run("return game.Button.__MLUABIND_LUANAMESPACEDESCRIPTIONTAG"), "game.Button");
-    EXPECT_EQ(host.Run("return getmetatable(__MLUABIND_LUAOPERATORCLOSURESSTORAGE['game.Vec']) == nil and "
-                       "__MLUABIND_LUAOPERATORCLOSURESSTORAGE['game.Vec'] == getmetatable(game.Vec(1, 2))"),
+    // Scripts see a read-only face of a class's metatable, in the storage and by getmetatable.
+    EXPECT_EQ(host.Run("local face = getmetatable(game.Vec(1, 2)) "
+                       "return face == __MLUABIND_LUAOPERATORCLOSURESSTORAGE['game.Vec'] and "
+                       "getmetatable(face) == false and type(face.__add) == 'function'"),
               "true");
+    EXPECT_EQ(host.Run("getmetatable(game.Vec(1, 2)).__add = nil return tostring(game.Vec(1, 2) + game.Vec(3, 4))"),
+              "10");
+    EXPECT_EQ(host.LastReport(),
+              "MetaOperatorNewIndex: error - the metatable of game.Vec is read-only ('__add' can't be set).\n");
 }
 
 TEST_F(Classes, BaseClassMethodsAndHiding)

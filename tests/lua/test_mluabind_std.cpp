@@ -73,11 +73,16 @@ TEST_F(StdTypes, StringsCrossAsBoundObjects)
 
 TEST_F(StdTypes, WideRingLimit)
 {
-    // 511 bytes pass; 512 break the ring's contract and are cut.
+    // 511 bytes pass; 512 don't fit the conversion buffer: a report, and the script goes on.
+    oxtest::AssertCapture asserts;
     host.Run("test.SetWide(string.rep('a', 511))");
     EXPECT_EQ(g_WideName.size(), 511u);
-    EXPECT_CONTRACT_FAILURE(host.Run("test.SetWide(string.rep('a', 600))"), "length < RingBufferSize");
-    EXPECT_EQ(g_WideName.size(), 511u);
+    EXPECT_TRUE(host.Reports.empty());
+    EXPECT_EQ(host.Run("test.SetWide(string.rep('b', 512)) return 'went on'"), "went on");
+    EXPECT_EQ(g_WideName, std::u16string(511, u'a')) << "the function doesn't run";
+    EXPECT_EQ(host.LastReport(),
+              "PM::ExtractParam: error - a text of 512 bytes is too long for a wide parameter (at most 511).\n");
+    EXPECT_EQ(asserts.Count(), 0u);
 }
 
 TEST_F(StdTypes, ContainersAndIterators)

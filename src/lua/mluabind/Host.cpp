@@ -311,7 +311,9 @@ void CHost::CreateMetatable(i::GenericClass* cls)
         lua_pushcclosure(L, &i::LuaOperatorCallProxieFunction, 2);
         lua_setfield(L, mt, i::OperatorEventName(index));
     }
-    // Script-visible storage by full name.
+    ProtectMetatable(mt, cls->FullName.c_str());
+    int face = lua_gettop(L);
+    // Script-visible storage by full name: the face, as getmetatable gives it.
     lua_pushstring(L, kMetatableStorage);
     lua_rawget(L, LUA_GLOBALSINDEX);
     if (!lua_istable(L, -1)) {
@@ -322,12 +324,32 @@ void CHost::CreateMetatable(i::GenericClass* cls)
         lua_rawset(L, LUA_GLOBALSINDEX);
     }
     lua_pushstring(L, cls->FullName.c_str());
-    lua_pushvalue(L, mt);
+    lua_pushvalue(L, face);
     lua_rawset(L, -3);
-    lua_pop(L, 1);
+    lua_settop(L, mt);
     if (cls->m_MetatableRef != LUA_NOREF)
         luaL_unref(L, LUA_REGISTRYINDEX, cls->m_MetatableRef);
     cls->m_MetatableRef = luaL_ref(L, LUA_REGISTRYINDEX);
+}
+
+void CHost::ProtectMetatable(int index, const char* name)
+{
+    if (index < 0 && index > LUA_REGISTRYINDEX)
+        index = lua_gettop(L) + index + 1;
+    lua_checkstack(L, 8);
+    lua_newtable(L);
+    lua_createtable(L, 0, 3);
+    lua_pushvalue(L, index);
+    lua_setfield(L, -2, "__index");
+    lua_pushlightuserdata(L, this);
+    lua_pushstring(L, name);
+    lua_pushcclosure(L, &i::MetaOperatorReadOnly, 2);
+    lua_setfield(L, -2, "__newindex");
+    lua_pushboolean(L, 0);
+    lua_setfield(L, -2, "__metatable");
+    lua_setmetatable(L, -2);
+    lua_pushvalue(L, -1);
+    lua_setfield(L, index, "__metatable");
 }
 
 void CHost::ExportClass(i::GenericClass* cls, int table, const char* name)

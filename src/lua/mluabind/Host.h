@@ -70,6 +70,12 @@ public:
     // Publishes every class, function and constant of the namespace into the globals.
     void Bind(const Namespace& ns);
 
+    // Hides the metatable at `index` behind a read-only face: getmetatable gives the face,
+    // which reads through to the metatable and reports every write (naming `name`). So no
+    // script can give a userdata a finaliser of its own, which could raise a Lua error in
+    // the middle of a bound call. Leaves the face on the stack.
+    void ProtectMetatable(int index, const char* name);
+
     i::GenericClass* FindClass(const std::type_info& type) const;
     i::GenericClass* FindClassByName(const std::string& name) const;
     const std::vector<i::GenericFunction*>* FindFunctions(const std::string& name) const;

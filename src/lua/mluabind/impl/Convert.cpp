@@ -111,7 +111,7 @@ void AppendClassName(CHost& host, std::string& text, const std::type_info& type,
 namespace {
 
 constexpr int RingSize = 8;
-constexpr size_t RingBufferSize = 512;
+constexpr size_t RingBufferSize = WideRingCapacity;
 // UTF-8 needs up to three bytes for each unit of a text below the limit.
 constexpr size_t NarrowBufferSize = RingBufferSize * 3;
 
@@ -136,6 +136,12 @@ const char16_t* NarrowToWideRing(const char* text, size_t length)
     std::memcpy(buffer, wide.data(), count * sizeof(char16_t));
     buffer[count] = 0;
     return buffer;
+}
+
+void ReportLongWideText(CHost& host, size_t length)
+{
+    host.Report("PM::ExtractParam: error - a text of %zu bytes is too long for a wide parameter (at most %zu).\n",
+                length, WideRingCapacity - 1);
 }
 
 const char* WideToNarrowRing(const char16_t* text)

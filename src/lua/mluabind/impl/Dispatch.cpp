@@ -320,6 +320,15 @@ int NewIndexBody(CHost& host, lua_State* L)
     return 0;
 }
 
+int ReadOnlyBody(CHost& host, lua_State* L)
+{
+    const char* name = lua_tostring(L, lua_upvalueindex(2));
+    const char* key = lua_type(L, 2) == LUA_TSTRING ? lua_tostring(L, 2) : luaL_typename(L, 2);
+    host.Report("MetaOperatorNewIndex: error - the metatable of %s is read-only ('%s' can't be set).\n",
+                name ? name : "?", key);
+    return 0;
+}
+
 int MethodCallBody(CHost& host, lua_State* L)
 {
     auto* self = static_cast<LuaCustomVariable*>(lua_touserdata(L, lua_upvalueindex(2)));
@@ -562,6 +571,7 @@ int MetaOperatorIndex(lua_State* L)
     return Entry<&IndexBody>(L);
 }
 int MetaOperatorNewIndex(lua_State* L) { return Entry<&NewIndexBody>(L); }
+int MetaOperatorReadOnly(lua_State* L) { return Entry<&ReadOnlyBody>(L); }
 int LuaMethodCallProxieFunction(lua_State* L) { return Entry<&MethodCallBody>(L); }
 int LuaOperatorCallProxieFunction(lua_State* L) { return Entry<&OperatorBody>(L); }
 int ConstructorCallDispatcher(lua_State* L) { return Entry<&ConstructorBody>(L); }

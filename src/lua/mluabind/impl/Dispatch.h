@@ -7,6 +7,8 @@ namespace mluabind::i {
 
 int MetaOperatorIndex(lua_State* L);
 int MetaOperatorNewIndex(lua_State* L);
+// __newindex of the face of a protected metatable (upvalue 2: the name it reports).
+int MetaOperatorReadOnly(lua_State* L);
 int LuaMethodCallProxieFunction(lua_State* L);
 int LuaOperatorCallProxieFunction(lua_State* L);
 int ConstructorCallDispatcher(lua_State* L);

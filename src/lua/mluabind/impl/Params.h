@@ -40,7 +40,10 @@ bool ExtractClassParam(CHost& host, lua_State* L, int index, const std::type_inf
 // "const X&", "X*", "unknown type", ...
 void AppendClassName(CHost& host, std::string& text, const std::type_info& type, bool is_const, char suffix);
 // The conversion rings: each result stays valid for the next seven conversions of its kind.
+// A text to widen must be shorter than WideRingCapacity bytes.
+constexpr size_t WideRingCapacity = 512;
 const char16_t* NarrowToWideRing(const char* text, size_t length);
+void ReportLongWideText(CHost& host, size_t length);
 const char* WideToNarrowRing(const char16_t* text);
 // Pushes a variable for a native pointer (null gives nil); reports an unknown class.
 int PushPointer(CHost& host, lua_State* L, GenericClass* cls, const std::type_info& type, void* object, bool is_const);
@@ -190,7 +193,7 @@ struct Param<const char16_t*> {
         int type = lua_type(L, index);
         return type == LUA_TSTRING || type == LUA_TNIL ? 2 : NoMatch;
     }
-    static bool Extract(CHost&, lua_State* L, int index, Storage& out)
+    static bool Extract(CHost& host, lua_State* L, int index, Storage& out)
     {
         if (lua_type(L, index) != LUA_TSTRING) {
             out = nullptr;
@@ -198,6 +201,10 @@ struct Param<const char16_t*> {
         }
         size_t length = 0;
         const char* text = lua_tolstring(L, index, &length);
+        if (length >= WideRingCapacity) {
+            ReportLongWideText(host, length);
+            return false;
+        }
         out = NarrowToWideRing(text, length);
         return true;
     }
