@@ -18,7 +18,9 @@ namespace ox::core {
 
 CApplication* g_Application = nullptr;
 
-wstring CApplication::UserDataFolder(const wstring& company, const wstring& product)
+namespace {
+
+wstring UserDataBase()
 {
     std::string base;
     const char* xdg = getenv("XDG_DATA_HOME");
@@ -28,7 +30,25 @@ wstring CApplication::UserDataFolder(const wstring& company, const wstring& prod
         const char* home = getenv("HOME");
         base = std::string(home && *home ? home : ".") + "/.local/share";
     }
-    return misc::sys::AppendPath(misc::sys::AppendPath(misc::ConvertToWide(base), company), product);
+    return misc::ConvertToWide(base);
+}
+
+bool IsPlainFolderName(const wstring& name)
+{
+    return !name.empty() && name != u"." && name != u".." && name.find_first_of(u"/\\") == wstring::npos;
+}
+
+} // namespace
+
+wstring CApplication::UserDataFolder(const wstring& company, const wstring& product)
+{
+    return misc::sys::AppendPath(misc::sys::AppendPath(UserDataBase(), company), product);
+}
+
+wstring CApplication::OwnDataFolder(const wstring& company, const wstring& product)
+{
+    const wstring& first = company.empty() ? product : company;
+    return IsPlainFolderName(first) ? misc::sys::AppendPath(UserDataBase(), first) : wstring();
 }
 
 CApplication::CApplication()
@@ -57,15 +77,26 @@ CApplication::CApplication()
     }
 
     m_AppDataFolder = UserDataFolder(m_Company, m_Product);
-    if (!misc::sys::CheckExistPath(m_AppDataFolder)) {
-        misc::sys::CreateFolder(m_AppDataFolder);
-        wstring companyFolder = m_AppDataFolder;
-        misc::sys::RemoveLastPathPart(companyFolder);
-        misc::sys::SetNamedFullAccess(companyFolder, true);
-    }
+    const wstring ownFolder = OwnDataFolder(m_Company, m_Product);
+    CreateDataFolder(ownFolder);
 
     diag::Log::Instance().SetFile(misc::WideToUtf8(m_AppDataFolder) + "/log.oxlog");
     OX_LOG("app", diag::LogInfo, "app created");
+    if (ownFolder.empty())
+        OX_LOG("data", diag::LogWarning,
+               "game.xml: company \"%s\" (product \"%s\") names no folder of the game's own; the data folder's "
+               "access stays as created",
+               misc::WideToUtf8(m_Company).c_str(), misc::WideToUtf8(m_Product).c_str());
+}
+
+void CApplication::CreateDataFolder(const wstring& ownFolder)
+{
+    misc::sys::SetFullAccessRoot(ownFolder);
+    if (misc::sys::CheckExistPath(m_AppDataFolder))
+        return;
+    misc::sys::CreateFolder(m_AppDataFolder);
+    if (!ownFolder.empty())
+        misc::sys::SetNamedFullAccess(ownFolder, true);
 }
 
 CApplication::~CApplication()

@@ -77,11 +77,16 @@ public:
 
     // The user's data folder of a game: $XDG_DATA_HOME (or ~/.local/share), company, product.
     static wstring UserDataFolder(const wstring& company, const wstring& product);
+    // The folder under that base the game owns and may open to its user: the company's, or
+    // the product's when the company is empty. Empty when that name is not one plain folder
+    // name, so that nothing beside or above the game's folders is ever changed.
+    static wstring OwnDataFolder(const wstring& company, const wstring& product);
 
 protected:
     void UpdateActivity();
     void ApplyCursorClip();
     void DrawLetterbox();
+    void CreateDataFolder(const wstring& ownFolder);
     // Forward: the widget tree while active, then the platform's default handling.
     void Forward();
 

@@ -134,10 +134,8 @@ bool CApp::Init()
     BindScripts();
 
     wstring saves = misc::sys::AppendPath(m_AppDataFolder, u"saves");
-    if (!misc::sys::CheckExistPath(saves)) {
-        misc::sys::CreateFolder(saves);
+    if (!misc::sys::CheckExistPath(saves) && misc::sys::CreateFolder(saves))
         misc::sys::SetNamedFullAccess(saves, false);
-    }
 
     m_Renderer.SetSourceResolution(kSourceWidth, kSourceHeight);
     // The window opens at the source size until the player's options choose the mode.

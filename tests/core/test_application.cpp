@@ -1,10 +1,14 @@
 #include "core/Application.h"
 #include "core/TimeManager.h"
+#include "misc/sys/Path.h"
 #include "support/RecordingBackend.h"
 #include "support/TestSupport.h"
 
+#include <sys/stat.h>
+
 using namespace ox::core;
 using ox::graphics::Resolution;
+namespace fs = std::filesystem;
 
 namespace {
 
@@ -85,6 +89,20 @@ struct AppFixture : ::testing::Test {
         app->ProcessEvent();
     }
 };
+
+// Sets the file-creation mask for its lifetime.
+struct ScopedUmask {
+    mode_t previous;
+    explicit ScopedUmask(mode_t mask) : previous(umask(mask)) {}
+    ~ScopedUmask() { umask(previous); }
+};
+
+unsigned FileMode(const fs::path& path)
+{
+    struct stat info {};
+    lstat(path.c_str(), &info);
+    return info.st_mode & 07777;
+}
 
 } // namespace
 
@@ -214,4 +232,54 @@ TEST_F(AppFixture, DrawBracketsTheFrameAndCoversTheBars)
     backend->ClearRecord();
     app->Draw();
     EXPECT_TRUE(backend->calls.empty());
+}
+
+TEST(AppDataFolder, FirstStartOpensOnlyTheGamesOwnFolderToItsUser)
+{
+    struct Case {
+        const char* settings;
+        const char* own; // the folder the game may change, under the base; empty: none
+    };
+    const Case cases[] = {
+        {"company=\"Tarnwick\" product=\"Quest\"", "Tarnwick"},
+        {"company=\"Tarnwick\"", "Tarnwick"},
+        {"company=\"\" product=\"Quest\"", "Quest"},
+        {"company=\"\"", ""},
+        {"company=\"..\" product=\"Quest\"", ""},
+    };
+    ScopedUmask mask(022);
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.settings);
+        oxtest::TempDir dir;
+        oxtest::ScopedCwd cwd(dir.Path());
+        const fs::path base = dir / "share" / "data";
+        oxtest::ScopedEnv xdg("XDG_DATA_HOME", base.c_str());
+        // Another application's files beside the game's, and the base itself, stay as they are.
+        dir.Write("share/data/other.txt", "");
+        dir.Write("share/data/OtherApp/secret", "");
+        dir.Write("share/Quest/kept", "");
+        chmod(base.c_str(), 0700);
+        chmod((base / "other.txt").c_str(), 0600);
+        chmod((base / "OtherApp").c_str(), 0700);
+        chmod((base / "OtherApp/secret").c_str(), 0600);
+        chmod((dir / "share/Quest/kept").c_str(), 0600);
+        dir.Write("game.xml", std::string("<?xml version=\"1.0\"?><settings ") + c.settings + "/>");
+        {
+            CApplication app;
+            EXPECT_TRUE(fs::is_directory(ox::misc::sys::NativePath(app.GetAppDataFolder())));
+        }
+        EXPECT_EQ(FileMode(base), 0700u);
+        EXPECT_EQ(FileMode(base / "other.txt"), 0600u);
+        EXPECT_EQ(FileMode(base / "OtherApp"), 0700u);
+        EXPECT_EQ(FileMode(base / "OtherApp/secret"), 0600u);
+        EXPECT_EQ(FileMode(dir / "share/Quest/kept"), 0600u);
+        if (!*c.own)
+            continue;
+        // What the game made is its user's alone to write.
+        const fs::path own = base / c.own;
+        EXPECT_EQ(FileMode(own) & 0700, 0700u);
+        EXPECT_EQ(FileMode(own) & 022, 0u);
+        for (const auto& entry : fs::recursive_directory_iterator(own))
+            EXPECT_EQ(FileMode(entry.path()) & 022, 0u) << entry.path();
+    }
 }
