@@ -10,8 +10,10 @@
 #include "misc/Unicode.h"
 #include "misc/sys/Path.h"
 
+#include <algorithm>
 #include <chrono>
 #include <cstdlib>
+#include <optional>
 #include <thread>
 
 namespace ox::core {
@@ -37,6 +39,9 @@ bool IsPlainFolderName(const wstring& name)
 {
     return !name.empty() && name != u"." && name != u".." && name.find_first_of(u"/\\") == wstring::npos;
 }
+
+// With Ctrl and Alt held: P, and 0x70 (the lower-case letter's code, which is F1's key code).
+constexpr uint32_t kReplayKeys[] = {0x50, 0x70};
 
 } // namespace
 
@@ -108,14 +113,14 @@ CApplication::~CApplication()
         g_Application = nullptr;
 }
 
-void CApplication::SetSystemIntegration(CSystemIntegration* adapter)
+void CApplication::SetSystemIntegration(std::unique_ptr<CSystemIntegration> adapter)
 {
-    m_SystemIntegration = adapter;
-    m_Renderer.SetSystemIntegration(adapter);
-    if (adapter) {
-        adapter->SetClient(this);
-        adapter->SetIdentity(misc::WideToUtf8(m_Product), misc::WideToUtf8(m_WindowTitle),
-                             misc::WideToUtf8(m_AppDataFolder));
+    m_SystemIntegration = std::move(adapter);
+    m_Renderer.SetSystemIntegration(m_SystemIntegration.get());
+    if (m_SystemIntegration) {
+        m_SystemIntegration->SetClient(this);
+        m_SystemIntegration->SetIdentity(misc::WideToUtf8(m_Product), misc::WideToUtf8(m_WindowTitle),
+                                         misc::WideToUtf8(m_AppDataFolder));
     }
 }
 
@@ -189,8 +194,10 @@ void CApplication::Update()
 
 void CApplication::Draw()
 {
-    if (!m_Minimized)
-        m_Renderer.CheckModeRestore();
+    if (!m_Minimized) {
+        if (std::optional<graphics::ModeRequest> mode = m_Renderer.CheckModeRestore())
+            ChangeScreenMode(mode->fullscreen, mode->bpp32, mode->width, mode->height);
+    }
     if (m_ShutdownDone || m_Minimized || !m_Focused)
         return;
     if (!m_Renderer.BeginScene())
@@ -268,10 +275,37 @@ void CApplication::ProcessEvent()
     case WM_SETCURSOR:
         event->result = 1;
         break;
+    case WM_DISPLAYCHANGE:
+        OnDisplayChange(*event);
+        event->result = 1;
+        return;
+    case WM_KEYDOWN:
+        if (IsReplayKey(*event)) {
+            if (m_ReplayKey)
+                m_ReplayKey();
+            event->result = 1;
+            return;
+        }
+        break;
     default:
         break;
     }
     Forward();
+}
+
+bool CApplication::IsReplayKey(const SystemEvent& event) const
+{
+    return std::find(std::begin(kReplayKeys), std::end(kReplayKeys), event.wParam) != std::end(kReplayKeys) &&
+           m_SystemIntegration->IsKeyDown(VK_CONTROL) && m_SystemIntegration->IsKeyDown(VK_MENU);
+}
+
+void CApplication::OnDisplayChange(const SystemEvent& event)
+{
+    const unsigned width = event.lParam & 0xFFFF;
+    const unsigned height = event.lParam >> 16;
+    const bool bpp32 = event.wParam == 32;
+    if (width != m_Renderer.GetWidth() || height != m_Renderer.GetHeight() || bpp32 != m_Renderer.Is32BPP())
+        m_Renderer.RequestModeRestore(bpp32);
 }
 
 void CApplication::UpdateActivity()

@@ -142,6 +142,11 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
     EXPECT_EQ(log.find("[font]"), std::string::npos) << "the demo's fonts load:\n" << log;
     EXPECT_EQ(log.find("assertion failed"), std::string::npos) << log;
+    // The demo defines no ManageThreads: said once, not every frame.
+    const std::string missing = "ManageThreads is missing";
+    size_t first = log.find(missing);
+    EXPECT_NE(first, std::string::npos) << log;
+    EXPECT_EQ(log.find(missing, first + 1), std::string::npos) << log;
     // The declared textures are known, and none of them failed to load.
     EXPECT_NE(log.find("[texman][0]: Texture information created in"), std::string::npos) << log;
     EXPECT_EQ(log.find("[texman][3]"), std::string::npos) << log;
