@@ -11,15 +11,19 @@
 #include "misc/Unicode.h"
 #include "misc/sys/Path.h"
 
+#include <algorithm>
 #include <chrono>
 #include <cstdlib>
+#include <optional>
 #include <thread>
 
 namespace ox::core {
 
 CApplication* g_Application = nullptr;
 
-wstring CApplication::UserDataFolder(const wstring& company, const wstring& product)
+namespace {
+
+wstring UserDataBase()
 {
     std::string base;
     const char* xdg = getenv("XDG_DATA_HOME");
@@ -29,7 +33,28 @@ wstring CApplication::UserDataFolder(const wstring& company, const wstring& prod
         const char* home = getenv("HOME");
         base = std::string(home && *home ? home : ".") + "/.local/share";
     }
-    return misc::sys::AppendPath(misc::sys::AppendPath(misc::ConvertToWide(base), company), product);
+    return misc::ConvertToWide(base);
+}
+
+bool IsPlainFolderName(const wstring& name)
+{
+    return !name.empty() && name != u"." && name != u".." && name.find_first_of(u"/\\") == wstring::npos;
+}
+
+// With Ctrl and Alt held: P, and 0x70 (the lower-case letter's code, which is F1's key code).
+constexpr uint32_t kReplayKeys[] = {0x50, 0x70};
+
+} // namespace
+
+wstring CApplication::UserDataFolder(const wstring& company, const wstring& product)
+{
+    return misc::sys::AppendPath(misc::sys::AppendPath(UserDataBase(), company), product);
+}
+
+wstring CApplication::OwnDataFolder(const wstring& company, const wstring& product)
+{
+    const wstring& first = company.empty() ? product : company;
+    return IsPlainFolderName(first) ? misc::sys::AppendPath(UserDataBase(), first) : wstring();
 }
 
 CApplication::CApplication()
@@ -58,15 +83,26 @@ CApplication::CApplication()
     }
 
     m_AppDataFolder = UserDataFolder(m_Company, m_Product);
-    if (!misc::sys::CheckExistPath(m_AppDataFolder)) {
-        misc::sys::CreateFolder(m_AppDataFolder);
-        wstring companyFolder = m_AppDataFolder;
-        misc::sys::RemoveLastPathPart(companyFolder);
-        misc::sys::SetNamedFullAccess(companyFolder, true);
-    }
+    const wstring ownFolder = OwnDataFolder(m_Company, m_Product);
+    CreateDataFolder(ownFolder);
 
     diag::Log::Instance().SetFile(misc::WideToUtf8(m_AppDataFolder) + "/log.oxlog");
     OX_LOG("app", diag::LogInfo, "app created");
+    if (ownFolder.empty())
+        OX_LOG("data", diag::LogWarning,
+               "game.xml: company \"%s\" (product \"%s\") names no folder of the game's own; the data folder's "
+               "access stays as created",
+               misc::WideToUtf8(m_Company).c_str(), misc::WideToUtf8(m_Product).c_str());
+}
+
+void CApplication::CreateDataFolder(const wstring& ownFolder)
+{
+    misc::sys::SetFullAccessRoot(ownFolder);
+    if (misc::sys::CheckExistPath(m_AppDataFolder))
+        return;
+    misc::sys::CreateFolder(m_AppDataFolder);
+    if (!ownFolder.empty())
+        misc::sys::SetNamedFullAccess(ownFolder, true);
 }
 
 CApplication::~CApplication()
@@ -78,14 +114,14 @@ CApplication::~CApplication()
         g_Application = nullptr;
 }
 
-void CApplication::SetSystemIntegration(CSystemIntegration* adapter)
+void CApplication::SetSystemIntegration(std::unique_ptr<CSystemIntegration> adapter)
 {
-    m_SystemIntegration = adapter;
-    m_Renderer.SetSystemIntegration(adapter);
-    if (adapter) {
-        adapter->SetClient(this);
-        adapter->SetIdentity(misc::WideToUtf8(m_Product), misc::WideToUtf8(m_WindowTitle),
-                             misc::WideToUtf8(m_AppDataFolder));
+    m_SystemIntegration = std::move(adapter);
+    m_Renderer.SetSystemIntegration(m_SystemIntegration.get());
+    if (m_SystemIntegration) {
+        m_SystemIntegration->SetClient(this);
+        m_SystemIntegration->SetIdentity(misc::WideToUtf8(m_Product), misc::WideToUtf8(m_WindowTitle),
+                                         misc::WideToUtf8(m_AppDataFolder));
     }
 }
 
@@ -160,8 +196,10 @@ void CApplication::Update()
 
 void CApplication::Draw()
 {
-    if (!m_Minimized)
-        m_Renderer.CheckModeRestore();
+    if (!m_Minimized) {
+        if (std::optional<graphics::ModeRequest> mode = m_Renderer.CheckModeRestore())
+            ChangeScreenMode(mode->fullscreen, mode->bpp32, mode->width, mode->height);
+    }
     if (m_ShutdownDone || m_Minimized || !m_Focused)
         return;
     if (!m_Renderer.BeginScene())
@@ -239,10 +277,37 @@ void CApplication::ProcessEvent()
     case WM_SETCURSOR:
         event->result = 1;
         break;
+    case WM_DISPLAYCHANGE:
+        OnDisplayChange(*event);
+        event->result = 1;
+        return;
+    case WM_KEYDOWN:
+        if (IsReplayKey(*event)) {
+            if (m_ReplayKey)
+                m_ReplayKey();
+            event->result = 1;
+            return;
+        }
+        break;
     default:
         break;
     }
     Forward();
+}
+
+bool CApplication::IsReplayKey(const SystemEvent& event) const
+{
+    return std::find(std::begin(kReplayKeys), std::end(kReplayKeys), event.wParam) != std::end(kReplayKeys) &&
+           m_SystemIntegration->IsKeyDown(VK_CONTROL) && m_SystemIntegration->IsKeyDown(VK_MENU);
+}
+
+void CApplication::OnDisplayChange(const SystemEvent& event)
+{
+    const unsigned width = event.lParam & 0xFFFF;
+    const unsigned height = event.lParam >> 16;
+    const bool bpp32 = event.wParam == 32;
+    if (width != m_Renderer.GetWidth() || height != m_Renderer.GetHeight() || bpp32 != m_Renderer.Is32BPP())
+        m_Renderer.RequestModeRestore(bpp32);
 }
 
 void CApplication::UpdateActivity()

@@ -11,6 +11,7 @@
 #include "misc/WideChar.h"
 
 #include <functional>
+#include <memory>
 
 namespace ox::core {
 
@@ -58,8 +59,10 @@ public:
     CSettings& GetSettings() { return m_Settings; }
     CResourceDeclarations& GetResourceDeclarations() { return m_ResourceDeclarations; }
     graphics::CRenderer* GetRenderer() { return &m_Renderer; }
-    CSystemIntegration* GetSystemIntegration() const { return m_SystemIntegration; }
-    void SetSystemIntegration(CSystemIntegration* adapter);
+    CSystemIntegration* GetSystemIntegration() const { return m_SystemIntegration.get(); }
+    // The application owns the adapter from here on: it goes only after the application,
+    // so nothing that can reach the application finds it deleted.
+    void SetSystemIntegration(std::unique_ptr<CSystemIntegration> adapter);
     int GetDebugLevel() const { return m_DebugLevel; }
     void SetDebugLevel(int level) { m_DebugLevel = level; }
     const wstring& GetAppDataFolder() const { return m_AppDataFolder; }
@@ -74,14 +77,25 @@ public:
     // Frames counted by Update, from 1.
     uint32_t GetFrameNumber() const { return graphics::GetFrameNumber(); }
     MediaPauseHooks& GetMediaPauseHooks() { return m_MediaHooks; }
+    // What Ctrl+Alt+P does (the replay starts or stops). The key is swallowed either way.
+    void SetReplayKey(std::function<void()> toggle) { m_ReplayKey = std::move(toggle); }
 
     // The user's data folder of a game: $XDG_DATA_HOME (or ~/.local/share), company, product.
     static wstring UserDataFolder(const wstring& company, const wstring& product);
+    // The folder under that base the game owns and may open to its user: the company's, or
+    // the product's when the company is empty. Empty when that name is not one plain folder
+    // name, so that nothing beside or above the game's folders is ever changed.
+    static wstring OwnDataFolder(const wstring& company, const wstring& product);
 
 protected:
     void UpdateActivity();
     void ApplyCursorClip();
     void DrawLetterbox();
+    void CreateDataFolder(const wstring& ownFolder);
+    // Ctrl+Alt+P (or Ctrl+Alt+F1) pressed: the replay key.
+    bool IsReplayKey(const SystemEvent& event) const;
+    // The desktop's size or depth changed: the renderer notes a mode restore if it differs.
+    void OnDisplayChange(const SystemEvent& event);
     // Forward: the widget tree while active, then the platform's default handling.
     void Forward();
 
@@ -93,7 +107,8 @@ protected:
     wstring m_WindowTitle;
     CSettings m_Settings;
     CResourceDeclarations m_ResourceDeclarations;
-    CSystemIntegration* m_SystemIntegration = nullptr;
+    // Declared before the renderer, which holds it too: the renderer goes first.
+    std::unique_ptr<CSystemIntegration> m_SystemIntegration;
     graphics::CRenderer m_Renderer;
     bool m_Minimized = false;
     bool m_Focused = true;
@@ -108,6 +123,7 @@ protected:
     const misc::IntVector m_DefaultResolution {1024, 768};
     CFrameLimiter m_FrameLimiter;
     MediaPauseHooks m_MediaHooks;
+    std::function<void()> m_ReplayKey;
 };
 
 extern CApplication* g_Application;

@@ -115,8 +115,9 @@ bool CApp::Init()
     // after the textures the sound declarations; after the fonts the quest data and the edit
     // widget's forbidden characters.
     lua::SetLuaHeapSize(0x1400000);
-    m_Adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
-    SetSystemIntegration(m_Adapter.get());
+    auto adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
+    m_Adapter = adapter.get();
+    SetSystemIntegration(std::move(adapter));
     LimitFPS(50);
     if (!CApplication::Init()) {
         m_InitFailure = m_Adapter->IsSecondInstance() ? InitFailure::SecondInstance : InitFailure::Platform;
@@ -134,10 +135,8 @@ bool CApp::Init()
     BindScripts();
 
     wstring saves = misc::sys::AppendPath(m_AppDataFolder, u"saves");
-    if (!misc::sys::CheckExistPath(saves)) {
-        misc::sys::CreateFolder(saves);
+    if (!misc::sys::CheckExistPath(saves) && misc::sys::CreateFolder(saves))
         misc::sys::SetNamedFullAccess(saves, false);
-    }
 
     m_Renderer.SetSourceResolution(kSourceWidth, kSourceHeight);
     // The window opens at the source size until the player's options choose the mode.
@@ -229,7 +228,8 @@ void CApp::DoUpdate()
 {
     if (m_Lua) {
         m_Lua->CheckFileChanges();
-        // The script threads, once the scripts define their manager.
+        // The script threads, once the scripts define their manager. Their absence is
+        // reported once, not every frame.
         lua_State* L = m_Lua->GetLuaState();
         lua_pushstring(L, "ManageThreads");
         lua_rawget(L, LUA_GLOBALSINDEX);
@@ -237,6 +237,9 @@ void CApp::DoUpdate()
         lua_pop(L, 1);
         if (present)
             lua::CallLuaFunction(m_Lua.get(), "ManageThreads");
+        else if (!m_ManageThreadsReported)
+            OX_LOG("lua", diag::LogWarning, "the script function ManageThreads is missing: script threads do not run");
+        m_ManageThreadsReported = !present;
     }
     CApplication::DoUpdate();
 }

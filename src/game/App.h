@@ -47,13 +47,15 @@ private:
     ox::core::CGroupTimerWrapper m_MainTimer;
     std::unique_ptr<ox::lua::CLua> m_Lua;
     ox::wstring m_GameFolder;
-    // The adapter lives as long as the process, as the platform's own window would.
-    std::unique_ptr<ox::core::CStandaloneApplicationSdl> m_Adapter;
+    // The adapter, owned by the application base, which outlives this part of the object.
+    ox::core::CStandaloneApplicationSdl* m_Adapter = nullptr;
     InitFailure m_InitFailure = InitFailure::None;
     // Drawn until the game's windows exist.
     std::unique_ptr<CDemoScene> m_Demo;
     // Serves the fonts' glyph images until the texture manager does.
     bool m_OutputRedirected = false;
+    // A missing ManageThreads was reported; it is reported again only after it existed.
+    bool m_ManageThreadsReported = false;
 };
 
 } // namespace k17

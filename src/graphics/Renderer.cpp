@@ -1,6 +1,5 @@
 #include "graphics/Renderer.h"
 
-#include "core/Application.h"
 #include "core/SystemIntegration.h"
 #include "diag/Log.h"
 #include "graphics/TextRender.h"
@@ -60,6 +59,8 @@ void CRenderer::UpdateWindowInfo()
     if (!m_Adapter)
         return;
     misc::IntRect client = m_Adapter->GetClientRect();
+    if (client.Width <= 0 || client.Height <= 0)
+        return; // no window yet: the size asked for stands
     m_Width = static_cast<unsigned>(client.Width);
     m_Height = static_cast<unsigned>(client.Height);
 }
@@ -67,8 +68,9 @@ void CRenderer::UpdateWindowInfo()
 bool CRenderer::InitGraphics()
 {
     ReleaseDevice(true);
-    if (!m_IsFullscreen)
-        UpdateWindowInfo();
+    // Full screen covers the desktop whatever size was asked, so the window's size counts
+    // in both modes: the canvas keeps its aspect and input maps to where it is drawn.
+    UpdateWindowInfo();
     OX_LOG("renderer", diag::LogInfo,
            "CRenderer::InitGraphics called with m_SourceWidth=%i m_SourceHeight=%i m_Width=%i m_Height=%i "
            "m_IsFullscreen=%i",
@@ -173,13 +175,17 @@ void CRenderer::RequestModeRestore(bool bpp32)
     m_RestoreBpp32 = bpp32;
 }
 
-void CRenderer::CheckModeRestore()
+std::optional<ModeRequest> CRenderer::CheckModeRestore()
 {
-    if (!m_RestorePending || m_IsFullscreen)
-        return;
+    if (!m_RestorePending)
+        return std::nullopt;
     m_RestorePending = false;
-    if (core::g_Application)
-        core::g_Application->ChangeScreenMode(false, m_RestoreBpp32, m_Width, m_Height);
+    if (!m_IsFullscreen)
+        return ModeRequest {false, m_RestoreBpp32, m_Width, m_Height};
+    // A full-screen device is rebuilt for the new desktop (this device is not lost by the
+    // change, so there is no loss to wait for).
+    ReleaseDevice(false);
+    return ModeRequest {true, m_RestoreBpp32, 0, 0};
 }
 
 // Frame --------------------------------------------------------------------------------
@@ -194,13 +200,6 @@ bool CRenderer::TestDevice()
             if (result != ResultDeviceNotReset)
                 return false;
         }
-    }
-    if (m_DeviceLost && m_RestorePending && m_IsFullscreen) {
-        m_RestorePending = false;
-        ReleaseDevice(false);
-        if (core::g_Application)
-            core::g_Application->ChangeScreenMode(true, m_RestoreBpp32, 0, 0);
-        return true;
     }
     if (!m_DeviceLost && hasDevice)
         return true;

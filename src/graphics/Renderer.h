@@ -13,6 +13,7 @@
 #include "misc/WideChar.h"
 
 #include <memory>
+#include <optional>
 #include <vector>
 
 namespace ox::core {
@@ -44,6 +45,15 @@ public:
     virtual void ReleaseDeviceResources(bool forReset) = 0;
 };
 
+// A screen mode the renderer asks the application for (after the desktop mode changed).
+// Width and height 0: the desktop's size.
+struct ModeRequest {
+    bool fullscreen;
+    bool bpp32;
+    unsigned width;
+    unsigned height;
+};
+
 // The backend the game runs on (OpenGL).
 std::unique_ptr<IRenderBackend> CreateDefaultBackend();
 
@@ -73,7 +83,7 @@ public:
     CRenderer(const CRenderer&) = delete;
     CRenderer& operator=(const CRenderer&) = delete;
 
-    // The window the canvas is drawn into (client size read from it when windowed).
+    // The window the canvas is drawn into (its real size is read from it).
     void SetSystemIntegration(core::CSystemIntegration* adapter) { m_Adapter = adapter; }
     // Replaces the backend; any device of the old one is released first.
     void SetBackend(std::unique_ptr<IRenderBackend> backend);
@@ -108,8 +118,9 @@ public:
     void EnumResolutions();
 
     void RequestModeRestore(bool bpp32);
-    // Before a frame: a pending restore of a windowed mode asks the application for it.
-    void CheckModeRestore();
+    // Before a frame: a pending restore, as the mode the application is to change to. A
+    // window keeps its size; full screen takes the desktop's, and the device goes first.
+    std::optional<ModeRequest> CheckModeRestore();
 
     // The frame.
     bool BeginScene();

@@ -1,71 +1,27 @@
 #include "core/Application.h"
 #include "core/TimeManager.h"
+#include "misc/sys/Path.h"
+#include "support/FakePlatform.h"
 #include "support/RecordingBackend.h"
 #include "support/TestSupport.h"
+
+#include <sys/stat.h>
 
 using namespace ox::core;
 using ox::graphics::Resolution;
 
+namespace fs = std::filesystem;
+using oxtest::FakePlatform;
+using Mode = FakePlatform::Mode;
+
 namespace {
-
-// A platform that records what the application asks of it.
-struct FakeAdapter : CSystemIntegration {
-    SystemEvent event;
-    unsigned desktopWidth = 1920, desktopHeight = 1080;
-    IntRect workArea {0, 0, 1920, 1040};
-    int frameWidth = 10, frameHeight = 30;
-    int shutdowns = 0, defaults = 0, stops = 0;
-    bool singleInstance = true;
-    std::vector<std::tuple<bool, bool, unsigned, unsigned>> modes;
-    IntRect client;
-
-    bool Init() override { return true; }
-    void Run() override {}
-    void Stop() override { ++stops; }
-    void Shutdown() override { ++shutdowns; }
-    bool CheckSingleInstance() override { return singleInstance; }
-    void RunNested() override {}
-    void StopNested() override {}
-    bool SetScreenMode(bool fullscreen, bool bpp32, unsigned width, unsigned height) override
-    {
-        modes.emplace_back(fullscreen, bpp32, width, height);
-        client = {0, 0, static_cast<int>(width), static_cast<int>(height)};
-        return true;
-    }
-    bool GetDesktopResolution(unsigned* w, unsigned* h) override
-    {
-        *w = desktopWidth;
-        *h = desktopHeight;
-        return true;
-    }
-    SystemEvent* GetCurrentEvent() override { return &event; }
-    void DefaultProcess() override { ++defaults; }
-    IntRect GetClientRect() override { return client; }
-    void AdjustRect(IntRect& r) override
-    {
-        r.Width += frameWidth;
-        r.Height += frameHeight;
-    }
-    IntRect GetWorkArea() override { return workArea; }
-    void ScreenToClient(IntPoint&) override {}
-    void ClientToScreen(IntPoint&) override {}
-    void SetCursorPos(IntPoint) override {}
-    IntPoint GetCursorPos() override { return {}; }
-    void SetCursorType(unsigned, bool) override {}
-    unsigned GetCursorType() override { return 0; }
-    void ShowCursor(bool) override {}
-    bool IsCursorVisible() override { return true; }
-    void ClipCursor(const IntRect*) override {}
-    void SetClient(IPlatformClient*) override {}
-    void SetIdentity(const std::string&, const std::string&, const std::string&) override {}
-};
 
 struct AppFixture : ::testing::Test {
     oxtest::TempDir dir;
     oxtest::ScopedCwd cwd {dir.Path()};
     oxtest::ScopedEnv xdg {"XDG_DATA_HOME", (dir / "data").c_str()};
-    FakeAdapter adapter;
     std::unique_ptr<CApplication> app;
+    FakePlatform* platform = nullptr; // owned by the application
 
     void SetUp() override
     {
@@ -74,17 +30,28 @@ struct AppFixture : ::testing::Test {
             GetTimeManager().Pause(false);
         dir.Write("game.xml", "<?xml version=\"1.0\"?><settings product=\"Quest\" version=\"123\"/>");
         app = std::make_unique<CApplication>();
-        app->SetSystemIntegration(&adapter);
+        auto owned = std::make_unique<FakePlatform>();
+        platform = owned.get();
+        app->SetSystemIntegration(std::move(owned));
         ASSERT_TRUE(app->Init());
         app->GetRenderer()->SetSourceResolution(1024, 768);
     }
-    void Send(uint32_t message, uint32_t wParam)
-    {
-        adapter.event.message = message;
-        adapter.event.wParam = wParam;
-        app->ProcessEvent();
-    }
+    void Send(uint32_t message, uint32_t wParam) { platform->Dispatch(message, wParam); }
 };
+
+// Sets the file-creation mask for its lifetime.
+struct ScopedUmask {
+    mode_t previous;
+    explicit ScopedUmask(mode_t mask) : previous(umask(mask)) {}
+    ~ScopedUmask() { umask(previous); }
+};
+
+unsigned FileMode(const fs::path& path)
+{
+    struct stat info {};
+    lstat(path.c_str(), &info);
+    return info.st_mode & 07777;
+}
 
 } // namespace
 
@@ -103,28 +70,28 @@ TEST_F(AppFixture, ChangeScreenModeArithmetic)
 
     // 0 x 0: the desktop size, 32 bits and full screen, whatever was asked.
     EXPECT_TRUE(app->ChangeScreenMode(false, false, 0, 0));
-    EXPECT_EQ(adapter.modes.back(), std::make_tuple(true, true, 1920u, 1080u));
+    EXPECT_EQ(platform->modes.back(), Mode(true, true, 1920u, 1080u));
 
     // Only a 16-bit mode of that size: the depth flips, not the size.
     app->ChangeScreenMode(true, true, 800, 600);
-    EXPECT_EQ(adapter.modes.back(), std::make_tuple(true, false, 800u, 600u));
+    EXPECT_EQ(platform->modes.back(), Mode(true, false, 800u, 600u));
 
     // No such mode at all: the last one of the list.
     app->ChangeScreenMode(true, true, 640, 480);
-    EXPECT_EQ(adapter.modes.back(), std::make_tuple(true, true, 1600u, 900u));
+    EXPECT_EQ(platform->modes.back(), Mode(true, true, 1600u, 900u));
 
     // A window that fits keeps the request but is brought to the source aspect.
     app->ChangeScreenMode(false, true, 1024, 768);
-    EXPECT_EQ(adapter.modes.back(), std::make_tuple(false, true, 1024u, 768u));
+    EXPECT_EQ(platform->modes.back(), Mode(false, true, 1024u, 768u));
     app->ChangeScreenMode(false, true, 1200, 768);
-    EXPECT_EQ(adapter.modes.back(), std::make_tuple(false, true, 1024u, 768u)) << "too wide: narrowed";
+    EXPECT_EQ(platform->modes.back(), Mode(false, true, 1024u, 768u)) << "too wide: narrowed";
 
     // Bigger than the work area: shrink by the frame and 15 pixels, then fit the aspect.
     app->ChangeScreenMode(false, true, 2048, 1536);
     unsigned height = 1040 - 30 - 15;                                        // 995
     unsigned width = static_cast<unsigned>(1920 - 10 - 15);                  // 1895, too wide
     width = static_cast<unsigned>(width * (1024.0f / 768.0f) / (float(width) / float(height)));
-    EXPECT_EQ(adapter.modes.back(), std::make_tuple(false, true, width, height));
+    EXPECT_EQ(platform->modes.back(), Mode(false, true, width, height));
     EXPECT_FALSE(ox::core::GetTimeManager().GetRoot()->IsPaused()) << "time runs again";
 }
 
@@ -150,10 +117,10 @@ TEST_F(AppFixture, ActivityAndMediaPausing)
     EXPECT_EQ(media.back(), "audio resume");
     EXPECT_EQ(std::count(media.begin(), media.end(), "video resume"), 0)
         << "the size message resumed the media before activity did; the video stays paused";
-    EXPECT_EQ(adapter.defaults, 4) << "every message reaches the default handling";
+    EXPECT_EQ(platform->defaults, 4) << "every message reaches the default handling";
 
     Send(WM_CLOSE, 0);
-    EXPECT_EQ(adapter.stops, 1);
+    EXPECT_EQ(platform->stops, 1);
 }
 
 TEST_F(AppFixture, FrameLimiterAndShutdown)
@@ -171,13 +138,13 @@ TEST_F(AppFixture, FrameLimiterAndShutdown)
     app->Update();
     EXPECT_TRUE(app->IsShutdownDone());
     app->DoShutdown();
-    EXPECT_EQ(adapter.shutdowns, 1) << "a second shutdown does nothing";
+    EXPECT_EQ(platform->shutdowns, 1) << "a second shutdown does nothing";
     EXPECT_EQ(app->GetState(), ShuttingDown);
 }
 
 TEST_F(AppFixture, SecondInstanceInitFailsQuietly)
 {
-    adapter.singleInstance = false;
+    platform->singleInstance = false;
     oxtest::MessageCapture boxes;
     EXPECT_FALSE(app->Init());
     EXPECT_TRUE(boxes.Boxes().empty());
@@ -214,4 +181,124 @@ TEST_F(AppFixture, DrawBracketsTheFrameAndCoversTheBars)
     backend->ClearRecord();
     app->Draw();
     EXPECT_TRUE(backend->calls.empty());
+}
+
+TEST(AppDataFolder, FirstStartOpensOnlyTheGamesOwnFolderToItsUser)
+{
+    struct Case {
+        const char* settings;
+        const char* own; // the folder the game may change, under the base; empty: none
+    };
+    const Case cases[] = {
+        {"company=\"Tarnwick\" product=\"Quest\"", "Tarnwick"},
+        {"company=\"Tarnwick\"", "Tarnwick"},
+        {"company=\"\" product=\"Quest\"", "Quest"},
+        {"company=\"\"", ""},
+        {"company=\"..\" product=\"Quest\"", ""},
+    };
+    ScopedUmask mask(022);
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.settings);
+        oxtest::TempDir dir;
+        oxtest::ScopedCwd cwd(dir.Path());
+        const fs::path base = dir / "share" / "data";
+        oxtest::ScopedEnv xdg("XDG_DATA_HOME", base.c_str());
+        // Another application's files beside the game's, and the base itself, stay as they are.
+        dir.Write("share/data/other.txt", "");
+        dir.Write("share/data/OtherApp/secret", "");
+        dir.Write("share/Quest/kept", "");
+        chmod(base.c_str(), 0700);
+        chmod((base / "other.txt").c_str(), 0600);
+        chmod((base / "OtherApp").c_str(), 0700);
+        chmod((base / "OtherApp/secret").c_str(), 0600);
+        chmod((dir / "share/Quest/kept").c_str(), 0600);
+        dir.Write("game.xml", std::string("<?xml version=\"1.0\"?><settings ") + c.settings + "/>");
+        {
+            CApplication app;
+            EXPECT_TRUE(fs::is_directory(ox::misc::sys::NativePath(app.GetAppDataFolder())));
+        }
+        EXPECT_EQ(FileMode(base), 0700u);
+        EXPECT_EQ(FileMode(base / "other.txt"), 0600u);
+        EXPECT_EQ(FileMode(base / "OtherApp"), 0700u);
+        EXPECT_EQ(FileMode(base / "OtherApp/secret"), 0600u);
+        EXPECT_EQ(FileMode(dir / "share/Quest/kept"), 0600u);
+        if (!*c.own)
+            continue;
+        // What the game made is its user's alone to write.
+        const fs::path own = base / c.own;
+        EXPECT_EQ(FileMode(own) & 0700, 0700u);
+        EXPECT_EQ(FileMode(own) & 022, 0u);
+        for (const auto& entry : fs::recursive_directory_iterator(own))
+            EXPECT_EQ(FileMode(entry.path()) & 022, 0u) << entry.path();
+    }
+}
+
+TEST_F(AppFixture, FullScreenCanvasFollowsTheRealWindowAndTheDesktop)
+{
+    ox::graphics::CRenderer& renderer = *app->GetRenderer();
+    renderer.SetAvailableResolutions({{1920, 1080, true}, {1280, 1024, true}, {1024, 768, true}});
+    app->SetCursorClip(true, {0, 0, 1024, 768});
+
+    // A full-screen 1024 x 768 covers the 1920 x 1080 desktop: pillar bars, and input
+    // (here the cursor clip) mapped onto the canvas as it is drawn.
+    app->ChangeScreenMode(true, true, 1024, 768);
+    EXPECT_EQ(platform->modes.back(), Mode(true, true, 1024u, 768u));
+    EXPECT_EQ(renderer.GetWidth(), 1920u);
+    EXPECT_EQ(renderer.GetHeight(), 1080u);
+    EXPECT_EQ(renderer.GetActiveRect(), ox::misc::FloatRect(240, 0, 1440, 1080));
+    EXPECT_FLOAT_EQ(renderer.GetScale().X, 1.40625f);
+    EXPECT_EQ(platform->cursorClip, ox::misc::IntRect(240, 0, 1440, 1080));
+
+    // The desktop changes its mode: the next frame takes the new desktop.
+    platform->ChangeDesktop(1280, 1024);
+    app->Draw();
+    EXPECT_EQ(platform->modes.back(), Mode(true, true, 1280u, 1024u));
+    EXPECT_EQ(renderer.GetWidth(), 1280u);
+    EXPECT_EQ(renderer.GetActiveRect(), ox::misc::FloatRect(0, 32, 1280, 960));
+    EXPECT_EQ(platform->handled.back().result, 1u) << "the display change is answered by the application";
+
+    // In a window the same change fits the window again, at its size.
+    app->ChangeScreenMode(false, true, 1024, 768);
+    const size_t changes = platform->modes.size();
+    platform->ChangeDesktop(1920, 1080);
+    app->Draw();
+    ASSERT_EQ(platform->modes.size(), changes + 1);
+    EXPECT_EQ(platform->modes.back(), Mode(false, true, 1024u, 768u));
+    app->Draw();
+    EXPECT_EQ(platform->modes.size(), changes + 1) << "once";
+}
+
+TEST_F(AppFixture, ReplayKeyIsSwallowed)
+{
+    int toggles = 0;
+    app->SetReplayKey([&] { ++toggles; });
+    oxtest::SendKey(*platform, SDL_SCANCODE_P, KMOD_LCTRL | KMOD_LALT);
+    EXPECT_EQ(toggles, 1);
+    auto key = std::find_if(platform->handled.begin(), platform->handled.end(),
+                            [](const SystemEvent& e) { return e.message == WM_KEYDOWN && e.wParam == 'P'; });
+    ASSERT_NE(key, platform->handled.end());
+    EXPECT_EQ(key->result, 1u);
+    EXPECT_EQ(platform->defaults, static_cast<int>(platform->handled.size()) - 1)
+        << "everything but the replay key reaches the default handling";
+
+    oxtest::SendKey(*platform, SDL_SCANCODE_P, KMOD_LCTRL);
+    oxtest::SendKey(*platform, SDL_SCANCODE_O, KMOD_LCTRL | KMOD_LALT);
+    EXPECT_EQ(toggles, 1) << "Ctrl+P and Ctrl+Alt+O are ordinary keys";
+}
+
+TEST(AppPlatform, AdapterIsReleasedOnlyAfterTheApplication)
+{
+    oxtest::TempDir dir;
+    oxtest::ScopedCwd cwd(dir.Path());
+    oxtest::ScopedEnv xdg("XDG_DATA_HOME", (dir / "data").c_str());
+    int shutdownsWhenReleased = -1;
+    {
+        CApplication app;
+        auto owned = std::make_unique<FakePlatform>();
+        owned->onDestroyed = [&](const FakePlatform& p) { shutdownsWhenReleased = p.shutdowns; };
+        app.SetSystemIntegration(std::move(owned));
+        ASSERT_TRUE(app.Init());
+        EXPECT_EQ(shutdownsWhenReleased, -1);
+    }
+    EXPECT_EQ(shutdownsWhenReleased, 1) << "shut down by the application's end, then released";
 }

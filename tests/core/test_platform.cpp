@@ -145,6 +145,22 @@ TEST(SdlTranslation, WindowEvents)
     SDL_Event quit {};
     quit.type = SDL_QUIT;
     EXPECT_EQ(Translate(quit)[0].message, WM_CLOSE);
+
+    // A full-screen window changes its size only with the desktop's mode.
+    e.window.event = SDL_WINDOWEVENT_SIZE_CHANGED;
+    e.window.data1 = 1280;
+    e.window.data2 = 1024;
+    EXPECT_EQ(Translate(e, state).size(), 1u);
+    state.fullscreen = true;
+    auto resized = Translate(e, state);
+    ASSERT_EQ(resized.size(), 2u);
+    EXPECT_EQ(resized[0], Message(WM_SIZE, SIZE_RESTORED, MakeLong(1280, 1024)));
+    EXPECT_EQ(resized[1], Message(WM_DISPLAYCHANGE, 32, MakeLong(1280, 1024)));
+    SDL_Event display {};
+    display.type = SDL_DISPLAYEVENT;
+    state.desktopWidth = 2560;
+    state.desktopHeight = 1440;
+    EXPECT_EQ(Translate(display, state)[0], Message(WM_DISPLAYCHANGE, 32, MakeLong(2560, 1440)));
 }
 
 namespace {

@@ -2,6 +2,7 @@
 #include "support/TestSupport.h"
 
 #include <signal.h>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -17,12 +18,14 @@ struct GameRun {
     oxtest::TempDir dir;
     fs::path game;
     fs::path data;
+    fs::path logFile;
     pid_t pid = -1;
 
     GameRun()
     {
         game = dir / "demo";
         data = dir / "xdg";
+        logFile = data / "Lanternfold" / "Lantern Demo" / "log.oxlog";
         fs::copy(OX_DEMO_GAME, game, fs::copy_options::recursive);
         fs::create_directories(data);
     }
@@ -56,7 +59,7 @@ struct GameRun {
         return -1;
     }
 
-    std::string Log() const { return oxtest::ReadFile(data / "Lanternfold" / "Lantern Demo" / "log.oxlog"); }
+    std::string Log() const { return oxtest::ReadFile(logFile); }
     std::string Output() const { return oxtest::ReadFile(game / "k17_stdout.txt"); }
 
     // Waits until the game's standard output holds `text`.
@@ -139,6 +142,11 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
     EXPECT_EQ(log.find("[font]"), std::string::npos) << "the demo's fonts load:\n" << log;
     EXPECT_EQ(log.find("assertion failed"), std::string::npos) << log;
+    // The demo defines no ManageThreads: said once, not every frame.
+    const std::string missing = "ManageThreads is missing";
+    size_t first = log.find(missing);
+    EXPECT_NE(first, std::string::npos) << log;
+    EXPECT_EQ(log.find(missing, first + 1), std::string::npos) << log;
     // The declared textures are known, and none of them failed to load.
     EXPECT_NE(log.find("[texman][0]: Texture information created in"), std::string::npos) << log;
     EXPECT_EQ(log.find("[texman][3]"), std::string::npos) << log;
@@ -163,4 +171,49 @@ TEST(GameHeadless, NoDisplayIsAClearErrorAndANonZeroExit)
     run.pid = pid;
     EXPECT_EQ(run.WaitExit(std::chrono::seconds(10)), 1);
     EXPECT_NE(oxtest::ReadFile(errors).find("Cannot open a display"), std::string::npos);
+}
+
+TEST(GameHeadless, DataFolderIsTheUsersAloneWithAndWithoutProduct)
+{
+    for (bool withProduct : {true, false}) {
+        SCOPED_TRACE(withProduct ? "with product" : "without product");
+        GameRun run;
+        if (!withProduct) {
+            std::string settings = oxtest::ReadFile(run.game / "game.xml");
+            const std::string product = " product=\"Lantern Demo\"";
+            ASSERT_NE(settings.find(product), std::string::npos);
+            settings.erase(settings.find(product), product.size());
+            std::ofstream(run.game / "game.xml", std::ios::binary) << settings;
+            run.logFile = run.data / "Lanternfold" / "log.oxlog";
+        }
+        // Another application's files beside the game's folder.
+        std::ofstream(run.data / "other.txt") << "";
+        fs::create_directories(run.data / "OtherApp");
+        chmod((run.data / "other.txt").c_str(), 0600);
+        chmod((run.data / "OtherApp").c_str(), 0700);
+
+        const mode_t mask = umask(022);
+        run.Start();
+        umask(mask);
+        // Init runs once the window is up.
+        ASSERT_TRUE(run.WaitForOutput("Lantern Demo Init", std::chrono::seconds(10)));
+        kill(run.pid, SIGTERM);
+        ASSERT_EQ(run.WaitExit(std::chrono::seconds(10)), 0) << run.Log();
+
+        struct stat info {};
+        stat((run.data / "other.txt").c_str(), &info);
+        EXPECT_EQ(info.st_mode & 07777, 0600u);
+        stat((run.data / "OtherApp").c_str(), &info);
+        EXPECT_EQ(info.st_mode & 07777, 0700u);
+        const fs::path own = run.data / "Lanternfold";
+        ASSERT_TRUE(fs::is_directory(own / (withProduct ? "Lantern Demo/saves" : "saves")));
+        std::vector<fs::path> entries {own};
+        for (const auto& entry : fs::recursive_directory_iterator(own))
+            entries.push_back(entry.path());
+        for (const fs::path& entry : entries) {
+            stat(entry.c_str(), &info);
+            EXPECT_EQ(info.st_mode & 022, 0u) << entry;
+            EXPECT_EQ(info.st_mode & 0600, 0600u) << entry;
+        }
+    }
 }

@@ -1,9 +1,9 @@
 // The OpenGL backend on real pixels: a small window (headless with SDL's offscreen driver)
 // whose back buffer is read after drawing through the renderer.
-#include "core/SystemIntegration.h"
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
 #include "graphics/gl/GlBackend.h"
+#include "support/FakePlatform.h"
 #include "support/TestSupport.h"
 
 #include <SDL.h>
@@ -15,37 +15,6 @@ using ox::misc::RectToPoly4;
 namespace {
 
 constexpr int kWidth = 64, kHeight = 48;
-
-// Just the window, for the renderer's device.
-struct WindowAdapter : ox::core::CSystemIntegration {
-    SDL_Window* window = nullptr;
-    void* GetWindowHandle() override { return window; }
-    ox::core::IntRect GetClientRect() override { return {0, 0, kWidth, kHeight}; }
-    bool Init() override { return true; }
-    void Run() override {}
-    void Stop() override {}
-    void Shutdown() override {}
-    bool CheckSingleInstance() override { return true; }
-    void RunNested() override {}
-    void StopNested() override {}
-    bool SetScreenMode(bool, bool, unsigned, unsigned) override { return true; }
-    bool GetDesktopResolution(unsigned*, unsigned*) override { return false; }
-    ox::core::SystemEvent* GetCurrentEvent() override { return nullptr; }
-    void DefaultProcess() override {}
-    void AdjustRect(ox::core::IntRect&) override {}
-    ox::core::IntRect GetWorkArea() override { return {}; }
-    void ScreenToClient(ox::core::IntPoint&) override {}
-    void ClientToScreen(ox::core::IntPoint&) override {}
-    void SetCursorPos(ox::core::IntPoint) override {}
-    ox::core::IntPoint GetCursorPos() override { return {}; }
-    void SetCursorType(unsigned, bool) override {}
-    unsigned GetCursorType() override { return 0; }
-    void ShowCursor(bool) override {}
-    bool IsCursorVisible() override { return true; }
-    void ClipCursor(const ox::core::IntRect*) override {}
-    void SetClient(ox::core::IPlatformClient*) override {}
-    void SetIdentity(const std::string&, const std::string&, const std::string&) override {}
-};
 
 class GlPixels : public ::testing::Test {
 protected:
@@ -73,8 +42,9 @@ protected:
     {
         if (!s_Skip.empty())
             GTEST_SKIP() << "OpenGL pixel tests skipped: " << s_Skip;
-        adapter.window = s_Window;
-        renderer.SetSystemIntegration(&adapter);
+        platform.windowHandle = s_Window;
+        platform.client = {0, 0, kWidth, kHeight};
+        renderer.SetSystemIntegration(&platform);
         renderer.SetSourceResolution(kWidth, kHeight);
         renderer.InitWindow(false, true, kWidth, kHeight);
         if (!renderer.GetBackend()->HasDevice())
@@ -94,7 +64,7 @@ protected:
 
     static std::string s_Skip;
     static SDL_Window* s_Window;
-    WindowAdapter adapter;
+    oxtest::FakePlatform platform;
     CRenderer renderer {std::make_unique<CGlBackend>()};
 };
 

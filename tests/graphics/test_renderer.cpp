@@ -324,14 +324,35 @@ TEST_F(RendererFixture, DeviceLossAndRecovery)
     EXPECT_TRUE(renderer->BeginScene());
     EXPECT_EQ(backend->resets, 2);
     renderer->EndScene();
+}
 
-    // Lost in full screen with a restore pending: the device goes and the mode changes.
+TEST_F(RendererFixture, ModeRestoreIsHandedToTheCaller)
+{
+    renderer->EndScene();
+    EXPECT_FALSE(renderer->CheckModeRestore().has_value());
+
+    // A window asks for its own size again, once.
+    renderer->RequestModeRestore(false);
+    std::optional<ModeRequest> mode = renderer->CheckModeRestore();
+    ASSERT_TRUE(mode.has_value());
+    EXPECT_FALSE(mode->fullscreen);
+    EXPECT_FALSE(mode->bpp32);
+    EXPECT_EQ(mode->width, 1024u);
+    EXPECT_EQ(mode->height, 768u);
+    EXPECT_FALSE(renderer->CheckModeRestore().has_value());
+    EXPECT_TRUE(backend->hasDevice);
+
+    // Full screen: the device goes, and the desktop's size (0 x 0) is asked for.
     renderer->InitWindow(true, true, 1024, 768);
     renderer->RequestModeRestore(true);
-    backend->cooperativeLevel = ResultDeviceNotReset;
-    EXPECT_FALSE(renderer->BeginScene()) << "no device until the mode change makes one";
-    EXPECT_EQ(backend->releases, 1);
+    mode = renderer->CheckModeRestore();
+    ASSERT_TRUE(mode.has_value());
+    EXPECT_TRUE(mode->fullscreen && mode->bpp32);
+    EXPECT_EQ(mode->width, 0u);
+    EXPECT_EQ(mode->height, 0u);
     EXPECT_FALSE(backend->hasDevice);
+    EXPECT_TRUE(renderer->BeginScene()) << "a frame without a device makes a new one";
+    EXPECT_TRUE(backend->hasDevice);
 }
 
 TEST(RendererDevice, CreationFailureIsLoggedAndRetriedEachFrame)

@@ -114,17 +114,28 @@ TEST(FileHelpers, FoldersListingAndAccess)
         EXPECT_FALSE(SetCurrentDirectory(u"missing"));
     }
 
+    // Full access is the owner's read and write (and search for folders), and only inside the root.
     fs::create_directories(dir / "open/inner");
     dir.Write("open/inner/f", "");
-    chmod((dir / "open").c_str(), 0700);
-    chmod((dir / "open/inner").c_str(), 0700);
-    chmod((dir / "open/inner/f").c_str(), 0600);
-    SetNamedFullAccess(W(dir / "open"), false);
-    EXPECT_EQ(Mode(dir / "open"), 0777u);
-    EXPECT_EQ(Mode(dir / "open/inner"), 0700u);
+    dir.Write("beside", "");
+    chmod((dir / "open").c_str(), 0500);
+    chmod((dir / "open/inner").c_str(), 0575);
+    chmod((dir / "open/inner/f").c_str(), 0466);
+    chmod((dir / "beside").c_str(), 0400);
+    SetFullAccessRoot(u"");
     SetNamedFullAccess(W(dir / "open"), true);
-    EXPECT_EQ(Mode(dir / "open/inner"), 0777u);
-    EXPECT_EQ(Mode(dir / "open/inner/f"), 0666u) << "files get read and write, not execute";
+    EXPECT_EQ(Mode(dir / "open"), 0500u) << "no root: nothing is changed";
+    SetFullAccessRoot(W(dir / "open"));
+    SetNamedFullAccess(W(dir / "open"), false);
+    EXPECT_EQ(Mode(dir / "open"), 0700u);
+    EXPECT_EQ(Mode(dir / "open/inner"), 0575u);
+    SetNamedFullAccess(W(dir / "open"), true);
+    EXPECT_EQ(Mode(dir / "open/inner"), 0755u) << "group and others lose write access";
+    EXPECT_EQ(Mode(dir / "open/inner/f"), 0644u) << "files get read and write, not execute";
+    SetNamedFullAccess(W(dir / "beside"), false);
+    SetNamedFullAccess(W(dir / "open/inner/../../beside"), false);
+    EXPECT_EQ(Mode(dir / "beside"), 0400u) << "outside the root";
+    SetFullAccessRoot(u"");
 }
 
 TEST(Language, FromTheLocaleEnvironment)

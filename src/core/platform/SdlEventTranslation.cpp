@@ -119,6 +119,9 @@ void TranslateWindow(const SDL_WindowEvent& window, const TranslationState& stat
         break;
     case SDL_WINDOWEVENT_SIZE_CHANGED:
         Push(out, WM_SIZE, SIZE_RESTORED, MakeLong(window.data1, window.data2));
+        // A full-screen window changes its size only with the desktop.
+        if (state.fullscreen)
+            Push(out, WM_DISPLAYCHANGE, 32, MakeLong(window.data1, window.data2));
         break;
     case SDL_WINDOWEVENT_MINIMIZED:
         Push(out, WM_SIZE, SIZE_MINIMIZED, 0);
@@ -179,6 +182,9 @@ void TranslateSdlEvent(const SDL_Event& event, const TranslationState& state, st
         break;
     case SDL_WINDOWEVENT:
         TranslateWindow(event.window, state, out);
+        break;
+    case SDL_DISPLAYEVENT:
+        Push(out, WM_DISPLAYCHANGE, 32, MakeLong(state.desktopWidth, state.desktopHeight));
         break;
     case SDL_KEYDOWN:
     case SDL_KEYUP:

@@ -15,6 +15,8 @@ struct TranslationState {
     int windowX = 0, windowY = 0;        // window position on the screen
     int clientWidth = 0, clientHeight = 0;
     int mouseX = 0, mouseY = 0;          // cursor in client coordinates
+    bool fullscreen = false;             // the window covers the desktop
+    int desktopWidth = 0, desktopHeight = 0;
 };
 
 // The virtual-key code of a key, 0 if it has none.

@@ -10,6 +10,7 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 
@@ -164,8 +165,18 @@ bool CStandaloneApplicationSdl::SetScreenMode(bool fullscreen, bool /*bpp32*/, u
 
 bool CStandaloneApplicationSdl::GetDesktopResolution(unsigned* width, unsigned* height)
 {
+    // A full-screen window covers the desktop and follows a change of its mode, which the
+    // display's own record may not show yet.
+    if (m_Wnd && m_Fullscreen) {
+        int w = 0, h = 0;
+        SDL_GetWindowSize(m_Wnd, &w, &h);
+        *width = static_cast<unsigned>(w);
+        *height = static_cast<unsigned>(h);
+        return true;
+    }
     SDL_DisplayMode mode;
-    if (!Init() || SDL_GetDesktopDisplayMode(0, &mode) != 0)
+    const int display = m_Wnd ? std::max(SDL_GetWindowDisplayIndex(m_Wnd), 0) : 0;
+    if (!Init() || SDL_GetDesktopDisplayMode(display, &mode) != 0)
         return false;
     *width = static_cast<unsigned>(mode.w);
     *height = static_cast<unsigned>(mode.h);
@@ -279,14 +290,43 @@ void CStandaloneApplicationSdl::ClipCursor(const IntRect* clientRect)
     SDL_SetWindowMouseRect(m_Wnd, &rect);
 }
 
-TranslationState CStandaloneApplicationSdl::CurrentState() const
+bool CStandaloneApplicationSdl::IsKeyDown(uint32_t virtualKey)
+{
+    const uint16_t modifiers = m_EventsIndex > 0 ? m_Modifiers : static_cast<uint16_t>(SDL_GetModState());
+    switch (virtualKey) {
+    case VK_SHIFT: return modifiers & KMOD_SHIFT;
+    case VK_CONTROL: return modifiers & KMOD_CTRL;
+    case VK_MENU: return modifiers & KMOD_ALT;
+    default: break;
+    }
+    int count = 0;
+    const Uint8* keys = SDL_GetKeyboardState(&count);
+    for (int i = 0; i < count; ++i) {
+        const auto scancode = static_cast<SDL_Scancode>(i);
+        if (keys[i] && VirtualKeyFromSdl(SDL_GetKeyFromScancode(scancode), scancode) == virtualKey)
+            return true;
+    }
+    return false;
+}
+
+TranslationState CStandaloneApplicationSdl::CurrentState(const SDL_Event& event)
 {
     TranslationState state;
-    state.modifiers = static_cast<uint16_t>(SDL_GetModState());
+    // A key event carries the modifiers of its moment; later ones may be queued behind it.
+    const bool key = event.type == SDL_KEYDOWN || event.type == SDL_KEYUP;
+    state.modifiers = key ? event.key.keysym.mod : static_cast<uint16_t>(SDL_GetModState());
+    m_Modifiers = state.modifiers;
     state.mouseButtons = SDL_GetMouseState(&state.mouseX, &state.mouseY);
     if (m_Wnd) {
         SDL_GetWindowPosition(m_Wnd, &state.windowX, &state.windowY);
         SDL_GetWindowSize(m_Wnd, &state.clientWidth, &state.clientHeight);
+    }
+    state.fullscreen = m_Fullscreen;
+    if (event.type == SDL_DISPLAYEVENT) {
+        unsigned width = 0, height = 0;
+        GetDesktopResolution(&width, &height);
+        state.desktopWidth = static_cast<int>(width);
+        state.desktopHeight = static_cast<int>(height);
     }
     return state;
 }
@@ -340,7 +380,7 @@ bool CStandaloneApplicationSdl::PumpMessages()
     if (m_VideoReady) {
         SDL_Event event;
         while (!m_StopRequested && SDL_PollEvent(&event)) {
-            TranslateSdlEvent(event, CurrentState(), m_Pending);
+            TranslateSdlEvent(event, CurrentState(event), m_Pending);
             for (size_t i = 0; i < m_Pending.size() && !m_StopRequested; ++i)
                 Dispatch(m_Pending[i]);
             m_Pending.clear();

@@ -45,6 +45,7 @@ public:
     void ShowCursor(bool show) override;
     bool IsCursorVisible() override { return m_CursorVisible; }
     void ClipCursor(const IntRect* clientRect) override;
+    bool IsKeyDown(uint32_t virtualKey) override;
 
     SDL_Window* GetWindow() const { return m_Wnd; }
     void* GetWindowHandle() override { return m_Wnd; }
@@ -61,7 +62,7 @@ private:
     void MainLoop();
     void PollNotifications();
     void ApplyCursor();
-    TranslationState CurrentState() const;
+    TranslationState CurrentState(const SDL_Event& event);
 
     IPlatformClient* m_Client = nullptr;
     SDL_Window* m_Wnd = nullptr;
@@ -75,6 +76,7 @@ private:
     SDL_Cursor* m_Cursors[4] = {};
     int m_EventsIndex = 0;
     SystemEvent m_Event;
+    uint16_t m_Modifiers = 0; // as the event being handled found them
     std::vector<SystemEvent> m_Pending;
 
     std::string m_Product;

@@ -1,6 +1,7 @@
 #include "misc/sys/Path.h"
 
 #include "diag/Assert.h"
+#include "diag/Log.h"
 #include "misc/Unicode.h"
 #include "misc/sys/MemMap.h"
 
@@ -8,6 +9,7 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <cstdlib>
 #include <dirent.h>
 #include <fcntl.h>
 #include <filesystem>
@@ -32,10 +34,36 @@ std::string TemporaryBeside(const std::string& path)
     return path + ".tmp";
 }
 
+std::string& FullAccessRoot()
+{
+    static auto* root = new std::string();
+    return *root;
+}
+
+// Whether the path, with every link and ".." resolved, is the full-access root or lies in it.
+bool InsideFullAccessRoot(const std::string& path)
+{
+    if (FullAccessRoot().empty())
+        return false;
+    char* root = realpath(FullAccessRoot().c_str(), nullptr);
+    char* resolved = realpath(path.c_str(), nullptr);
+    bool inside = false;
+    if (root && resolved) {
+        std::string folder = root;
+        std::string target = resolved;
+        inside = target == folder || (target.size() > folder.size() && target.compare(0, folder.size(), folder) == 0 &&
+                                      (folder.back() == '/' || target[folder.size()] == '/'));
+    }
+    free(root);
+    free(resolved);
+    return inside;
+}
+
+// u+rwX, go-w.
 void AddFullAccess(const std::string& path, const struct stat& info)
 {
-    mode_t wanted = S_ISDIR(info.st_mode) ? (info.st_mode | 0777) : (info.st_mode | 0666);
-    chmod(path.c_str(), wanted & 07777);
+    mode_t user = S_ISDIR(info.st_mode) || (info.st_mode & 0111) ? S_IRWXU : (S_IRUSR | S_IWUSR);
+    chmod(path.c_str(), (info.st_mode | user) & ~(S_IWGRP | S_IWOTH) & 07777);
 }
 
 } // namespace
@@ -113,6 +141,11 @@ void SetNamedFullAccess(const wstring& path, bool inherit)
     struct stat info;
     if (native.empty() || lstat(native.c_str(), &info) != 0 || S_ISLNK(info.st_mode))
         return;
+    if (!InsideFullAccessRoot(native)) {
+        OX_LOG("data", diag::LogWarning, "SetNamedFullAccess: %s is outside the game's data folder, left as it is",
+               native.c_str());
+        return;
+    }
     AddFullAccess(native, info);
     if (!inherit || !S_ISDIR(info.st_mode))
         return;
@@ -124,6 +157,8 @@ void SetNamedFullAccess(const wstring& path, bool inherit)
             AddFullAccess(child, info);
     }
 }
+
+void SetFullAccessRoot(const wstring& root) { FullAccessRoot() = NativePath(root); }
 
 bool Compress(const wstring& source, const wstring& destination)
 {

@@ -31,9 +31,14 @@ uint32_t CalcCRC(const void* data, size_t size, uint32_t crc = 0);
 // The CRC of a whole file, -1 if it cannot be mapped (missing or empty).
 int CalcFileCRC(const wstring& path);
 
-// Gives everyone full access: read and write for files, everything for folders. With
-// `inherit`, what a folder holds now is changed too. Failures are ignored.
+// Full access for the owning user: read and write, and search for folders (u+rwX); group
+// and others lose write access and gain nothing. With `inherit`, what a folder holds now is
+// changed too (symbolic links are left alone). Only the full-access root and what it holds
+// are touched: any other path, or any path while no root is set, is logged and left as it
+// is. Failures are ignored.
 void SetNamedFullAccess(const wstring& path, bool inherit);
+// The one folder (with everything in it) SetNamedFullAccess may change; empty: none.
+void SetFullAccessRoot(const wstring& root);
 
 // How a file written through a temporary file came out.
 enum class AtomicWrite { Done, CannotCreate, CannotWrite, CannotReplace };
