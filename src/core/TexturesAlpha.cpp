@@ -137,13 +137,10 @@ bool CTexturesAlpha::IsOpaque(const graphics::CTexture& texture, int x, int y) c
 bool CTexturesAlpha::IsOpaque(const char* _from, int x, int y) const
 {
     OX_ASSERT(_from != 0);
-    OX_ASSERT(IsAvailable());
-    if (!_from || !IsAvailable())
-        return false;
+    // A texture without a mask, or no masks at all, is a game-data mistake: logged, not solid.
+    OX_CHECK_DATA(_from && IsAvailable(), false);
     const TextureAlphaDesc* desc = Find(_from);
-    OX_ASSERT(desc);
-    if (!desc)
-        return false;
+    OX_CHECK_DATA(desc, false);
     if (desc->uniform)
         return desc->uniform_value != 0;
     if (x < 0 || y < 0 || x >= desc->width || y >= desc->height)

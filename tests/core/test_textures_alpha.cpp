@@ -101,6 +101,10 @@ TEST(TexturesAlpha, MasksAnswerEveryPixelInBothOrders)
         EXPECT_FALSE(store.IsOpaque(source.id.c_str(), int(source.width), 0));
         EXPECT_FALSE(store.IsOpaque(source.id.c_str(), 0, int(source.height)));
     }
+    // A texture that has no mask is a data mistake: logged, not solid, and the game goes on.
+    oxtest::LogCapture log;
+    EXPECT_FALSE(store.IsOpaque("no-such-texture", 1, 1));
+    EXPECT_TRUE(log.Contains("check failed \"desc\""));
 }
 
 TEST(TexturesAlpha, UniformImagesLongRunsAndSortedIds)
