@@ -239,6 +239,44 @@ TEST_F(LuaHostTest, ScriptsCantGiveAUserdataAFailingFinaliser)
     EXPECT_EQ(Probe::Alive, 0) << "every native object of every call was destroyed";
 }
 
+TEST_F(LuaHostTest, ScriptsLoadChunksAsTextOnlyAndNoNativeLibraries)
+{
+    // Every way a script loads a chunk refuses a precompiled one (the undump trusts its
+    // input), naming it; text loads as before, a first line of '#' skipped.
+    CLua lua("", false);
+    dir.Write("text.lua", "#!/usr/bin/lua\nreturn 'text'");
+    ASSERT_TRUE(lua.Run("package.path = './?.lua' code = string.dump(function() return 'compiled' end) "
+                        "local f = io.open('compiled.lua', 'wb') f:write(code) f:close() "
+                        "function pieces(text) local i = 0 return function() i = i + 1 "
+                        "return i == 1 and text:sub(1, 1) or i == 2 and text:sub(2) or nil end end"));
+    const char* refusals[][2] = {
+        {"loadstring(code)", "(string)"},
+        {"loadstring(code, '=named')", "named"},
+        {"load(pieces(code))", "(load)"},
+        {"loadfile('compiled.lua')", "compiled.lua"},
+        {"pcall(dofile, 'compiled.lua')", "compiled.lua"},
+        {"pcall(require, 'compiled')", "error loading module 'compiled' from file './compiled.lua':\n\t./compiled.lua"},
+    };
+    for (auto [call, name] : refusals)
+        EXPECT_EQ(Eval(lua, std::string("local _, message = ") + call + " return tostring(message)"),
+                  std::string(name) + ": a precompiled Lua chunk is refused, scripts are loaded as text only");
+    EXPECT_TRUE(LogHas("lua|3|compiled.lua: a precompiled Lua chunk is refused"));
+    EXPECT_EQ(Eval(lua, "return loadstring('return 1')() .. load(pieces('return 2'))() .. loadfile('text.lua')() .. "
+                        "dofile('text.lua') .. require('text')"),
+              "12texttexttext");
+    EXPECT_EQ(Eval(lua, "return select(2, loadstring('x = = 1', '=line')) .. "
+                        "select(2, loadfile('missing.lua'))"),
+              "line:1: unexpected symbol near '='cannot open missing.lua: No such file or directory");
+    EXPECT_EQ(Eval(lua, "return select(2, pcall(require, 'missing'))"),
+              "module 'missing' not found:\n\tno field package.preload['missing']\n\tno file './missing.lua'");
+
+    // No native library loads: a module found only as one is not found at all.
+    dir.Write("native.so", "not a library");
+    EXPECT_EQ(Eval(lua, "return tostring(package.loadlib) .. tostring(package.cpath) .. #package.loaders"), "nilnil2");
+    EXPECT_EQ(Eval(lua, "package.cpath = './?.so' package.path = '' return select(2, pcall(require, 'native'))"),
+              "module 'native' not found:\n\tno field package.preload['native']");
+}
+
 TEST_F(LuaHostTest, CallLuaFunctionPushesEachArgumentKind)
 {
     CLua lua("", false);
