@@ -256,6 +256,34 @@ int RefuseNative(lua_State* L)
     return CallOriginal(L);
 }
 
+// getlocal and setlocal: the slots of a native frame hold what native code works on.
+int RefuseNativeFrame(lua_State* L)
+{
+    int arg = lua_type(L, 1) == LUA_TTHREAD ? 1 : 0;
+    lua_State* thread = arg ? lua_tothread(L, 1) : L;
+    int level = luaL_checkint(L, arg + 1);
+    lua_Debug frame;
+    if (lua_getstack(thread, level, &frame) && lua_getinfo(thread, "S", &frame) && std::strcmp(frame.what, "C") == 0)
+        return luaL_error(L, "%s: not for the frame of a native function", GuardedName(L));
+    // The original counts this function as one more level.
+    if (thread == L) {
+        lua_pushinteger(L, level + 1);
+        lua_replace(L, arg + 1);
+    }
+    return CallOriginal(L);
+}
+
+// sethook: call and return events fire around native calls, where an error of the hook
+// would jump over native frames; lines and counts fire inside Lua functions only.
+int RefuseNativeEvents(lua_State* L)
+{
+    int arg = lua_type(L, 1) == LUA_TTHREAD ? 1 : 0;
+    const char* mask = lua_isnoneornil(L, arg + 1) ? nullptr : lua_tostring(L, arg + 2);
+    if (mask && std::strpbrk(mask, "cr"))
+        return luaL_error(L, "%s: hooks are on lines and counts only, not on calls or returns", GuardedName(L));
+    return CallOriginal(L);
+}
+
 } // namespace
 
 void RestrictLoading(lua_State* L)
@@ -294,14 +322,17 @@ void GuardDebugLibrary(lua_State* L)
     lua_getglobal(L, "debug");
     if (lua_istable(L, -1)) {
         int debug = lua_gettop(L);
-        lua_pushnil(L);
-        lua_setfield(L, debug, "getregistry");
+        for (const char* name : {"getregistry", "debug"}) {
+            lua_pushnil(L);
+            lua_setfield(L, debug, name);
+        }
         // Honours a protected metatable, as getmetatable does.
         lua_getglobal(L, "getmetatable");
         lua_setfield(L, debug, "getmetatable");
-        const luaL_Reg guards[] = {{"getfenv", &RefuseNative},    {"setfenv", &RefuseNative},
-                                   {"getupvalue", &RefuseNative}, {"setupvalue", &RefuseNative},
-                                   {"setmetatable", &RefuseNative}};
+        const luaL_Reg guards[] = {{"getfenv", &RefuseNative},      {"setfenv", &RefuseNative},
+                                   {"getupvalue", &RefuseNative},   {"setupvalue", &RefuseNative},
+                                   {"setmetatable", &RefuseNative}, {"getlocal", &RefuseNativeFrame},
+                                   {"setlocal", &RefuseNativeFrame}, {"sethook", &RefuseNativeEvents}};
         for (const luaL_Reg& guard : guards) {
             lua_getfield(L, debug, guard.name);
             lua_pushfstring(L, "debug.%s", guard.name);

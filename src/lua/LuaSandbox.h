@@ -19,9 +19,10 @@ const char* RefusePrecompiled(lua_State* L, const char* name);
 // the native loaders of require are taken away.
 void RestrictLoading(lua_State* L);
 
-// The debug library keeps away from userdata and native functions: no registry,
-// metatables as getmetatable gives them, no environment or upvalue of a userdata or
-// native function.
+// The debug library keeps away from userdata, native functions and native frames: no
+// registry, no debug.debug, metatables as getmetatable gives them, no environment or
+// upvalue of a userdata or native function, no local of a native frame, and hooks on
+// lines and counts only.
 void GuardDebugLibrary(lua_State* L);
 
 } // namespace ox::lua

@@ -277,6 +277,36 @@ TEST_F(LuaHostTest, ScriptsLoadChunksAsTextOnlyAndNoNativeLibraries)
               "module 'native' not found:\n\tno field package.preload['native']");
 }
 
+TEST_F(LuaHostTest, DebugLibraryKeepsOffNativeFrames)
+{
+    CLua lua("", false);
+    // The locals of a native frame (here one that calls back and then returns its first
+    // argument) can't be read or written; those of Lua functions can.
+    lua_State* L = lua.GetLuaState();
+    lua_pushcfunction(L, [](lua_State* state) {
+        lua_call(state, 0, 0);
+        return 1;
+    });
+    lua_setglobal(L, "callBack");
+    for (std::string access : {"getlocal(2, 1)", "setlocal(2, 1, 'changed')"})
+        EXPECT_NE(Eval(lua, "return select(2, pcall(callBack, 'kept', function() debug." + access + " end))")
+                      .find("debug." + access.substr(0, 8) + ": not for the frame of a native function"),
+                  std::string::npos);
+    EXPECT_EQ(Eval(lua, "return select(2, pcall(callBack, 'kept', function() end))"), "kept");
+    EXPECT_EQ(Eval(lua, "local x = 1 local function f() debug.setlocal(2, 1, 5) end f() "
+                        "return x .. select(2, debug.getlocal(1, 1))"),
+              "55");
+    EXPECT_EQ(Eval(lua, "local co = coroutine.create(function(a) coroutine.yield() end) coroutine.resume(co, 'arg') "
+                        "return select(2, debug.getlocal(co, 1, 1)) .. tostring(pcall(debug.getlocal, co, 0, 1))"),
+              "argfalse");
+    // Hooks only on lines and counts: a call or return hook would fire around native calls.
+    EXPECT_NE(Eval(lua, "return select(2, pcall(debug.sethook, print, 'c'))").find("debug.sethook"), std::string::npos);
+    EXPECT_EQ(Eval(lua, "local n = 0 debug.sethook(function() n = n + 1 end, '', 1) for i = 1, 10 do end "
+                        "debug.sethook() return n > 10"),
+              "true");
+    EXPECT_EQ(Eval(lua, "return tostring(debug.debug)"), "nil");
+}
+
 TEST_F(LuaHostTest, CallLuaFunctionPushesEachArgumentKind)
 {
     CLua lua("", false);
