@@ -5,6 +5,7 @@
 #include "diag/Log.h"
 #include "diag/Message.h"
 #include "lua/LuaHeap.h"
+#include "lua/LuaSandbox.h"
 #include "misc/GamePack.h"
 #include "misc/Unicode.h"
 
@@ -27,21 +28,6 @@ namespace {
 
 constexpr size_t kReportCapacity = 65535;
 
-// Compiled chunks are never loaded: the undump of Lua 5.1 trusts its input.
-bool IsPrecompiled(const char* text, size_t size) { return size > 0 && text[0] == LUA_SIGNATURE[0]; }
-
-// A debug function (upvalue 1, named by upvalue 2) that refuses userdata and native
-// functions: their metatables, environments and upvalues lead to finalisers.
-int RefuseNative(lua_State* L)
-{
-    if (lua_type(L, 1) == LUA_TUSERDATA || lua_iscfunction(L, 1))
-        return luaL_error(L, "%s: not for userdata or native functions", lua_tostring(L, lua_upvalueindex(2)));
-    lua_pushvalue(L, lua_upvalueindex(1));
-    lua_insert(L, 1);
-    lua_call(L, lua_gettop(L) - 1, LUA_MULTRET);
-    return lua_gettop(L);
-}
-
 // A metatable that is its own __index (as the one of files) would hand itself out to
 // every script through that field: it gets a copy of its fields as method table instead.
 void DetachSelfIndex(lua_State* L, int mt)
@@ -61,28 +47,6 @@ void DetachSelfIndex(lua_State* L, int mt)
     lua_pushnil(L);
     lua_setfield(L, -2, "__index");
     lua_setfield(L, mt, "__index");
-}
-
-void GuardDebugLibrary(lua_State* L)
-{
-    lua_getglobal(L, "debug");
-    if (!lua_istable(L, -1)) {
-        lua_pop(L, 1);
-        return;
-    }
-    int debug = lua_gettop(L);
-    lua_pushnil(L);
-    lua_setfield(L, debug, "getregistry");
-    // Honours a protected metatable, as getmetatable does.
-    lua_getglobal(L, "getmetatable");
-    lua_setfield(L, debug, "getmetatable");
-    for (const char* name : {"getfenv", "setfenv", "getupvalue", "setupvalue", "setmetatable"}) {
-        lua_getfield(L, debug, name);
-        lua_pushfstring(L, "debug.%s", name);
-        lua_pushcclosure(L, &RefuseNative, 2);
-        lua_setfield(L, debug, name);
-    }
-    lua_pop(L, 1);
 }
 
 } // namespace
@@ -105,6 +69,7 @@ CLua::CLua(const std::string& id, bool watch_files) : CHost(NewState(), false), 
     lua_pushcfunction(L, &luaopen_lfs);
     lua_call(L, 0, 0);
     SealFinalisers();
+    RestrictLoading(L);
     if (!m_Id.empty()) {
         auto f = m_Luas.find(m_Id);
         OX_ASSERT(f==m_Luas.end());
@@ -173,8 +138,8 @@ void CLua::ReportLuaError()
 void CLua::RunScript(const char* text, size_t size, const char* _script)
 {
     if (IsPrecompiled(text, size)) {
-        OX_LOG("lua", diag::LogError, "%s: a precompiled Lua chunk is refused, scripts are loaded as text only",
-               _script);
+        RefusePrecompiled(L, _script);
+        lua_pop(L, 1);
         return;
     }
     // Editors may start a UTF-8 file with a byte order mark, which Lua can't read.
@@ -254,7 +219,8 @@ void CLua::LoadLuaScripts(const char* folder)
 bool CLua::Run(const std::string& code)
 {
     if (IsPrecompiled(code.data(), code.size())) {
-        OX_LOG("lua", diag::LogError, "CLua::Run: a precompiled Lua chunk is refused, code is run as text only");
+        RefusePrecompiled(L, "CLua::Run");
+        lua_pop(L, 1);
         return false;
     }
     int top = lua_gettop(L);

@@ -63,7 +63,8 @@ public:
 private:
     static lua_State* NewState();
     // Keeps scripts away from finalisers: no newproxy, the library metatables are
-    // protected, and the debug library can't reach into userdata or native functions.
+    // protected, and the debug library can't reach into userdata, native functions or
+    // native frames.
     void SealFinalisers();
     void RunScript(const char* text, size_t size, const char* _script);
 

@@ -239,6 +239,74 @@ TEST_F(LuaHostTest, ScriptsCantGiveAUserdataAFailingFinaliser)
     EXPECT_EQ(Probe::Alive, 0) << "every native object of every call was destroyed";
 }
 
+TEST_F(LuaHostTest, ScriptsLoadChunksAsTextOnlyAndNoNativeLibraries)
+{
+    // Every way a script loads a chunk refuses a precompiled one (the undump trusts its
+    // input), naming it; text loads as before, a first line of '#' skipped.
+    CLua lua("", false);
+    dir.Write("text.lua", "#!/usr/bin/lua\nreturn 'text'");
+    ASSERT_TRUE(lua.Run("package.path = './?.lua' code = string.dump(function() return 'compiled' end) "
+                        "local f = io.open('compiled.lua', 'wb') f:write(code) f:close() "
+                        "function pieces(text) local i = 0 return function() i = i + 1 "
+                        "return i == 1 and text:sub(1, 1) or i == 2 and text:sub(2) or nil end end"));
+    const char* refusals[][2] = {
+        {"loadstring(code)", "(string)"},
+        {"loadstring(code, '=named')", "named"},
+        {"load(pieces(code))", "(load)"},
+        {"loadfile('compiled.lua')", "compiled.lua"},
+        {"pcall(dofile, 'compiled.lua')", "compiled.lua"},
+        {"pcall(require, 'compiled')", "error loading module 'compiled' from file './compiled.lua':\n\t./compiled.lua"},
+    };
+    for (auto [call, name] : refusals)
+        EXPECT_EQ(Eval(lua, std::string("local _, message = ") + call + " return tostring(message)"),
+                  std::string(name) + ": a precompiled Lua chunk is refused, scripts are loaded as text only");
+    EXPECT_TRUE(LogHas("lua|3|compiled.lua: a precompiled Lua chunk is refused"));
+    EXPECT_EQ(Eval(lua, "return loadstring('return 1')() .. load(pieces('return 2'))() .. loadfile('text.lua')() .. "
+                        "dofile('text.lua') .. require('text')"),
+              "12texttexttext");
+    EXPECT_EQ(Eval(lua, "return select(2, loadstring('x = = 1', '=line')) .. "
+                        "select(2, loadfile('missing.lua'))"),
+              "line:1: unexpected symbol near '='cannot open missing.lua: No such file or directory");
+    EXPECT_EQ(Eval(lua, "return select(2, pcall(require, 'missing'))"),
+              "module 'missing' not found:\n\tno field package.preload['missing']\n\tno file './missing.lua'");
+
+    // No native library loads: a module found only as one is not found at all.
+    dir.Write("native.so", "not a library");
+    EXPECT_EQ(Eval(lua, "return tostring(package.loadlib) .. tostring(package.cpath) .. #package.loaders"), "nilnil2");
+    EXPECT_EQ(Eval(lua, "package.cpath = './?.so' package.path = '' return select(2, pcall(require, 'native'))"),
+              "module 'native' not found:\n\tno field package.preload['native']");
+}
+
+TEST_F(LuaHostTest, DebugLibraryKeepsOffNativeFrames)
+{
+    CLua lua("", false);
+    // The locals of a native frame (here one that calls back and then returns its first
+    // argument) can't be read or written; those of Lua functions can.
+    lua_State* L = lua.GetLuaState();
+    lua_pushcfunction(L, [](lua_State* state) {
+        lua_call(state, 0, 0);
+        return 1;
+    });
+    lua_setglobal(L, "callBack");
+    for (std::string access : {"getlocal(2, 1)", "setlocal(2, 1, 'changed')"})
+        EXPECT_NE(Eval(lua, "return select(2, pcall(callBack, 'kept', function() debug." + access + " end))")
+                      .find("debug." + access.substr(0, 8) + ": not for the frame of a native function"),
+                  std::string::npos);
+    EXPECT_EQ(Eval(lua, "return select(2, pcall(callBack, 'kept', function() end))"), "kept");
+    EXPECT_EQ(Eval(lua, "local x = 1 local function f() debug.setlocal(2, 1, 5) end f() "
+                        "return x .. select(2, debug.getlocal(1, 1))"),
+              "55");
+    EXPECT_EQ(Eval(lua, "local co = coroutine.create(function(a) coroutine.yield() end) coroutine.resume(co, 'arg') "
+                        "return select(2, debug.getlocal(co, 1, 1)) .. tostring(pcall(debug.getlocal, co, 0, 1))"),
+              "argfalse");
+    // Hooks only on lines and counts: a call or return hook would fire around native calls.
+    EXPECT_NE(Eval(lua, "return select(2, pcall(debug.sethook, print, 'c'))").find("debug.sethook"), std::string::npos);
+    EXPECT_EQ(Eval(lua, "local n = 0 debug.sethook(function() n = n + 1 end, '', 1) for i = 1, 10 do end "
+                        "debug.sethook() return n > 10"),
+              "true");
+    EXPECT_EQ(Eval(lua, "return tostring(debug.debug)"), "nil");
+}
+
 TEST_F(LuaHostTest, CallLuaFunctionPushesEachArgumentKind)
 {
     CLua lua("", false);

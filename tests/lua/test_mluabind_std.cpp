@@ -33,6 +33,7 @@ protected:
             test.AddFunction(Function("NameRef", []() -> const std::string& { return g_Name; }));
             test.AddFunction(Function("SetWide", [](const std::u16string& name) { g_WideName = name; }));
             test.AddFunction(Function("GetWide", [] { return g_WideName; }));
+            test.AddFunction(Function("WideText", [] { return g_WideName.c_str(); }));
             test.AddFunction(Function("Numbers", []() -> std::vector<int>& { return g_Numbers; }));
             test.AddFunction(Function("Walk", [] { return ox::misc::CGenericIterator<std::vector<int>>(&g_Numbers); }));
             test.AddFunction(Function("WalkNothing", [] { return ox::misc::CGenericIterator<std::vector<int>>(); }));
@@ -71,10 +72,30 @@ TEST_F(StdTypes, StringsCrossAsBoundObjects)
     EXPECT_EQ(host.Run("local w = std.wstring('ab') w.push_back(67) return w.c_str()"), "abC");
 }
 
-TEST_F(StdTypes, WideRingLimit)
+TEST_F(StdTypes, WideTextLimits)
 {
-    // 511 bytes pass; 512 don't fit the conversion buffer: a report, and the script goes on.
     oxtest::AssertCapture asserts;
+    // A wide text returned to Lua arrives whole, however long; a surrogate pair stays one
+    // character, wherever the text falls.
+    auto repeat = [](auto unit, size_t count) {
+        decltype(unit) text;
+        while (count-- > 0)
+            text += unit;
+        return text;
+    };
+    std::pair<std::u16string, std::string> texts[] = {
+        {repeat(std::u16string(u"\u0416"), 512), repeat(std::string("\xd0\x96"), 512)},
+        {repeat(std::u16string(u"\U0001F600"), 20000), repeat(std::string("\xf0\x9f\x98\x80"), 20000)},
+        {u"a" + repeat(std::u16string(u"\U0001F600"), 20000), "a" + repeat(std::string("\xf0\x9f\x98\x80"), 20000)},
+    };
+    for (auto& [wide, narrow] : texts) {
+        g_WideName = wide;
+        lua_pushlstring(host.GetLuaState(), narrow.data(), narrow.size());
+        lua_setglobal(host.GetLuaState(), "expected");
+        EXPECT_EQ(host.Run("return test.WideText() == expected"), "true") << narrow.size();
+    }
+    // 511 bytes pass to a wide parameter; 512 don't fit the conversion buffer: a report,
+    // and the script goes on.
     host.Run("test.SetWide(string.rep('a', 511))");
     EXPECT_EQ(g_WideName.size(), 511u);
     EXPECT_TRUE(host.Reports.empty());

@@ -112,11 +112,12 @@ namespace {
 
 constexpr int RingSize = 8;
 constexpr size_t RingBufferSize = WideRingCapacity;
-// UTF-8 needs up to three bytes for each unit of a text below the limit.
-constexpr size_t NarrowBufferSize = RingBufferSize * 3;
+// The text converter takes pieces whose UTF-8 stays within its limit: up to three bytes a unit.
+constexpr size_t NarrowPieceSize = ox::misc::kMaxConvertLength / 3;
 
 char16_t g_WideRing[RingSize][RingBufferSize];
-char g_NarrowRing[RingSize][NarrowBufferSize];
+// Narrow results have no length limit: each slot holds its text.
+std::string g_NarrowRing[RingSize];
 int g_WideNext = 0;
 int g_NarrowNext = 0;
 
@@ -148,17 +149,20 @@ const char* WideToNarrowRing(const char16_t* text)
 {
     if (!text)
         return nullptr;
-    size_t length = ox::misc::WideLength(text);
-    OX_ASSERT(length < RingBufferSize);
-    if (length >= RingBufferSize)
-        length = RingBufferSize - 1;
-    char* buffer = g_NarrowRing[g_NarrowNext];
+    std::string narrow;
+    std::u16string_view rest(text, ox::misc::WideLength(text));
+    while (!rest.empty()) {
+        size_t count = std::min(rest.size(), NarrowPieceSize);
+        // A pair of surrogates stays in one piece.
+        if (count < rest.size() && rest[count - 1] >= 0xD800 && rest[count - 1] <= 0xDBFF)
+            --count;
+        narrow += ox::misc::ConvertToNarrow(rest.substr(0, count));
+        rest.remove_prefix(count);
+    }
+    std::string& slot = g_NarrowRing[g_NarrowNext];
     g_NarrowNext = (g_NarrowNext + 1) % RingSize;
-    std::string narrow = ox::misc::ConvertToNarrow(std::u16string_view(text, length));
-    size_t count = std::min(narrow.size(), NarrowBufferSize - 1);
-    std::memcpy(buffer, narrow.data(), count);
-    buffer[count] = 0;
-    return buffer;
+    slot = std::move(narrow);
+    return slot.c_str();
 }
 
 int PushPointer(CHost& host, lua_State* L, GenericClass* cls, const std::type_info& type, void* object, bool is_const)

@@ -40,7 +40,7 @@ bool ExtractClassParam(CHost& host, lua_State* L, int index, const std::type_inf
 // "const X&", "X*", "unknown type", ...
 void AppendClassName(CHost& host, std::string& text, const std::type_info& type, bool is_const, char suffix);
 // The conversion rings: each result stays valid for the next seven conversions of its kind.
-// A text to widen must be shorter than WideRingCapacity bytes.
+// A text to widen must be shorter than WideRingCapacity bytes; a narrowed one has any length.
 constexpr size_t WideRingCapacity = 512;
 const char16_t* NarrowToWideRing(const char* text, size_t length);
 void ReportLongWideText(CHost& host, size_t length);
