@@ -20,6 +20,10 @@ constexpr const char* kChannel = "anim";
 constexpr size_t kMaxValueLength = 1024;
 constexpr size_t kMaxKeyLength = 55;
 
+// A missing attribute is zeroed memory: colours too are zero (transparent black), not the
+// white a colour starts as.
+constexpr graphics::Color kZeroColor(0u);
+
 struct PendingObject {
     ClipObjectBase base {};
     std::vector<uint8_t> extension;
@@ -220,6 +224,7 @@ bool ReadExtension(const Reader& read, ClipObjectType type, std::vector<uint8_t>
     }
     case TextType: {
         TextExtension e {};
+        e.bk_color = kZeroColor;
         ok = read.Text("ft", e.font, "font id") && read.Text("bk", e.background, "background image id") &&
              read.Text("tx", e.key, "text key", kMaxKeyLength);
         read.Unsigned("tx_fl", e.tx_fl);
@@ -250,6 +255,7 @@ void StartObject(Conversion& c, ClipObjectType type, int depth)
     object.depth = depth;
     ClipObjectBase& base = object.base;
     base.type = type;
+    base.color = kZeroColor;
     const Reader read {c};
     object.usable = read.Text("id", base.id, "object id") && read.Text("path", base.path, "path id") &&
                     ReadExtension(read, type, object.extension);
@@ -283,6 +289,7 @@ void AddKey(Conversion& c)
         return;
     const Reader read {c};
     KeyState key {};
+    key.color = kZeroColor;
     read.Int("t", key.t);
     read.Bool("itpl", key.itpl);
     read.Vector("p", key.pos);
