@@ -399,7 +399,8 @@ void CClipObject::InterpolateState(float k)
     out.flip = k <= 0.999f ? a.flip : b.flip;
     // A custom flag shows only at the ends of a piece, so that the game can see its edge.
     out.custom = k > 0.999f ? b.custom : (k < 0.001f ? a.custom : 0);
-    auto channel = [k](int16_t x, int16_t y) { return static_cast<int16_t>(std::trunc(x + (y - x) * double(k))); };
+    // Truncated toward zero, in double precision.
+    auto channel = [k](int16_t x, int16_t y) { return static_cast<int16_t>(x + (y - x) * double(k)); };
     out.color = graphics::Color(channel(a.color.Red, b.color.Red), channel(a.color.Green, b.color.Green),
                                 channel(a.color.Blue, b.color.Blue), channel(a.color.Alpha, b.color.Alpha));
     for (int i = 0; i < 4; ++i)
