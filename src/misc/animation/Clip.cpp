@@ -70,27 +70,59 @@ void CClip::Clear()
 
 bool CClip::Load(const char* id, bool reset) { return Load(CClipsLoader::Instance(), id, reset); }
 
-bool CClip::Load(const CClipsLoader& loader, const char* id, bool reset, int depth)
+bool CClip::CanNest(const char* id, const LoadContext* parent)
+{
+    const int depth = parent ? parent->depth + 1 : 0;
+    for (const LoadContext* outer = parent; outer; outer = outer->parent)
+        if (strcmp(outer->clipId, id) == 0) {
+            OX_LOG(kChannel, diag::LogError, "Clip '%s' holds itself through '%s'; the inner one is left out", id,
+                   parent->clipId);
+            return false;
+        }
+    if (depth >= kMaxClipNesting) {
+        OX_LOG(kChannel, diag::LogError, "Clip '%s' is nested more than %d deep in '%s'; left out", id,
+               kMaxClipNesting, parent->clipId);
+        return false;
+    }
+    return true;
+}
+
+bool CClip::Load(const CClipsLoader& loader, const char* id, bool reset, const LoadContext* parent)
 {
     Clear();
+    if (!id || !CanNest(id, parent))
+        return false;
     const ClipRecord* clip = loader.FindClip(id);
     if (!clip) {
-        OX_LOG(kChannel, diag::LogWarning, "Clip '%s' does not exist", id ? id : "");
+        OX_LOG(kChannel, diag::LogWarning, "Clip '%s' does not exist", id);
         return false;
     }
     OX_ASSERT(((size_t)clip) % 4 == 0);
     m_Id = &clip->id;
     m_Rect = FloatRect(clip->x, clip->y, clip->w, clip->h);
-    const LoadContext context {&loader, clip->id.c_str(), depth};
+    LoadBudget ownBudget;
+    LoadBudget& budget = parent ? *parent->budget : ownBudget;
+    const LoadContext context {&loader, clip->id.c_str(), parent ? parent->depth + 1 : 0, parent, &budget};
+    auto spend = [&] {
+        if (budget.left > 0) {
+            --budget.left;
+            return true;
+        }
+        if (!budget.reported)
+            OX_LOG(kChannel, diag::LogError, "Clip '%s': more than %u objects with its nested clips; the rest are "
+                   "left out", clip->id.c_str(), kMaxClipObjects);
+        budget.reported = true;
+        return false;
+    };
     for (const ClipObjectBase* base = ObjectsBegin(clip); base; base = NextObject(base)) {
-        if (base->type != PathType)
+        if (base->type != PathType || !spend())
             continue;
         auto path = std::make_unique<CPathObject>();
         if (path->LoadFromBase(base, context))
             m_Paths.push_back(std::move(path));
     }
     for (const ClipObjectBase* base = ObjectsBegin(clip); base; base = NextObject(base)) {
-        if (base->type == PathType || (!base->visible && !g_LoadInvisibleObjects))
+        if (base->type == PathType || (!base->visible && !g_LoadInvisibleObjects) || !spend())
             continue;
         std::unique_ptr<CClipObject> object = MakeObject(base->type);
         if (!object) {

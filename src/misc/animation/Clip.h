@@ -18,12 +18,13 @@ namespace ox::misc::anim {
 class CClipsLoader;
 class CClipObject;
 class CPathObject;
+struct LoadContext;
 
 // Objects whose record says they are not visible are left out at load unless this is set
 // (editors set it; the game clears it at start).
 extern bool g_LoadInvisibleObjects;
 
-// Clips nested in clips deeper than this are refused (a clip that holds itself).
+// Clips nested in clips deeper than this are refused.
 constexpr int kMaxClipNesting = 8;
 
 class CClip {
@@ -36,9 +37,10 @@ public:
 
     // Builds the objects of the clip `id` of the process-wide loader (or of `loader`) and
     // plays them. With `reset` the clip's place, size, angle, colour and flags start afresh.
-    // False when there is no such clip.
+    // False (logged) when there is no such clip, or, nested in `parent`, when the clip would
+    // hold itself or nest too deep.
     bool Load(const char* id, bool reset = true);
-    bool Load(const CClipsLoader& loader, const char* id, bool reset = true, int depth = 0);
+    bool Load(const CClipsLoader& loader, const char* id, bool reset = true, const LoadContext* parent = nullptr);
     void Clear();
     CClipObject* FindObject(const char* id) const;
     const std::vector<std::unique_ptr<CClipObject>>& GetObjects() const { return m_Objects; }
@@ -77,6 +79,8 @@ public:
 
 private:
     void SetFlipBit(unsigned bit, bool on) { m_Flip = on ? (m_Flip | bit) : (m_Flip & ~bit); }
+    // Whether the clip `id` may be built inside `parent`: never inside itself, never too deep.
+    static bool CanNest(const char* id, const LoadContext* parent);
     template <class F>
     void ForEachObject(F action);
 

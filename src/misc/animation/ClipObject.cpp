@@ -4,6 +4,7 @@
 #include "diag/Log.h"
 #include "misc/animation/ClipServices.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstdlib>
 #include <utility>
@@ -15,6 +16,8 @@ namespace {
 constexpr const char* kChannel = "anim";
 
 int AppTime() { return static_cast<int>(ClipTimeManager().GetAppTime()); }
+
+int ClampTime(int64_t time) { return static_cast<int>(std::clamp<int64_t>(time, -kMaxClipTime, kMaxClipTime)); }
 
 } // namespace
 
@@ -47,9 +50,12 @@ bool CClipObject::CheckKeyStates(const ClipObjectBase& base, const LoadContext& 
     if (base.keypointsnum == 0 && base.type != PathType)
         return refuse("it has no key state", 0);
     const KeyState* keys = base.KeyStates();
-    for (unsigned i = 1; i < base.keypointsnum; ++i)
-        if (keys[i].t <= keys[i - 1].t)
+    for (unsigned i = 0; i < base.keypointsnum; ++i) {
+        if (keys[i].t < -kMaxClipTime || keys[i].t > kMaxClipTime)
+            return refuse("a key's time lies beyond twelve days", keys[i].t);
+        if (i > 0 && keys[i].t <= keys[i - 1].t)
             return refuse("its key states are out of order at the time", keys[i].t);
+    }
     return true;
 }
 
@@ -114,8 +120,8 @@ core::CTimer* CClipObject::Timer()
 int CClipObject::GetRawTime() const
 {
     if (const core::CTimer* timer = m_Timer.Get())
-        return static_cast<int>(timer->GetTime());
-    return AppTime() - m_StartTime;
+        return ClampTime(timer->GetTime());
+    return ClampTime(int64_t(AppTime()) - m_StartTime);
 }
 
 void CClipObject::Play()
@@ -154,9 +160,9 @@ void CClipObject::MoveTime(int time, bool apply)
     if (!EnumKeyStates())
         return;
     if (core::CTimer* timer = m_Timer.Get())
-        timer->SetTime(time > 0 ? static_cast<unsigned>(time) : 0);
+        timer->SetTime(static_cast<unsigned>(std::clamp(time, 0, kMaxClipTime)));
     else
-        m_StartTime = AppTime() - time;
+        m_StartTime = ClampTime(int64_t(AppTime()) - ClampTime(time));
     if (apply)
         Interpolate();
 }

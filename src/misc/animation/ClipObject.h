@@ -25,12 +25,26 @@ enum FlipFlags : unsigned { FlipHorizontal = 1, FlipVertical = 2 };
 
 // An object keeps at most this many key states.
 constexpr unsigned kMaxObjectKeyStates = 126;
+// Key times and an object's clock stay within this many milliseconds either side of 0
+// (twelve days), so that twice a period and every difference of times fit in 32 bits.
+constexpr int kMaxClipTime = 1 << 30;
+
+// How many objects one clip may build, the clips nested in it included: nesting repeats
+// clips, and a dump could otherwise ask for more than any memory holds.
+constexpr unsigned kMaxClipObjects = 20000;
+
+struct LoadBudget {
+    unsigned left = kMaxClipObjects;
+    bool reported = false;
+};
 
 // What loading an object needs beside its record.
 struct LoadContext {
     const CClipsLoader* loader;  // nested clips come from the same bulk
     const char* clipId;          // names the clip in log lines
     int depth;                   // how deep in nested clips this clip is
+    const LoadContext* parent;   // the clip this one is nested in, or null
+    LoadBudget* budget;          // shared by a clip and everything nested in it
 };
 
 class CClipObject {

@@ -245,26 +245,20 @@ void CTextObject::Draw(graphics::CRenderer* renderer)
 bool CClipViewObject::LoadFromBase(const ClipObjectBase* base, const LoadContext& context)
 {
     const std::string id = ExtensionOf<ClipViewExtension>(base).clip.str();
-    if (context.depth + 1 >= kMaxClipNesting) {
-        OX_LOG(kChannel, diag::LogError, "Clip '%s': clip object '%s' nests clips more than %d deep (does '%s' hold "
-               "itself?); left out", context.clipId, base->id.c_str(), kMaxClipNesting, id.c_str());
-        return false;
-    }
     // The inner clip first: the object's own record then sets its place and size.
-    if (!context.loader || !m_Clip.Load(*context.loader, id.c_str(), true, context.depth + 1)) {
-        OX_LOG(kChannel, diag::LogError, "Clip '%s': clip object '%s' shows the unknown clip '%s'; left out",
+    if (!context.loader || !m_Clip.Load(*context.loader, id.c_str(), true, &context)) {
+        OX_LOG(kChannel, diag::LogError, "Clip '%s': clip object '%s' cannot show the clip '%s'; left out",
                context.clipId, base->id.c_str(), id.c_str());
         return false;
     }
     m_Loader = context.loader;
-    m_Depth = context.depth + 1;
     return CClipObject::LoadFromBase(base, context);
 }
 
 void CClipViewObject::Reload()
 {
     if (m_Loader)
-        m_Clip.Load(*m_Loader, m_Clip.GetId(), false, m_Depth);
+        m_Clip.Load(*m_Loader, std::string(m_Clip.GetId()).c_str(), false);
 }
 
 void CClipViewObject::SetPoly(const Poly4& poly)

@@ -152,7 +152,6 @@ private:
     CClip m_Clip;
     unsigned m_CustomFlags = 0;
     const CClipsLoader* m_Loader = nullptr;
-    int m_Depth = 0;
 };
 
 // A particle system of a clip. Particle systems are not supported yet: the object keeps

@@ -116,7 +116,8 @@ std::vector<uint32_t> BuildClipsBulk(const ClipRecords& clips)
         entry.id.Hash();
         entry.offset = static_cast<uint32_t>(clipAt);
         memcpy(bytes + entryAt, &entry, sizeof entry);
-        memcpy(bytes + clipAt, record.data(), record.size() * 4);
+        if (!record.empty())
+            memcpy(bytes + clipAt, record.data(), record.size() * 4);
         entryAt += sizeof(ClipTableEntry);
         clipAt += record.size() * 4;
     }

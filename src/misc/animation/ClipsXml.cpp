@@ -383,7 +383,8 @@ void FinishClip(Conversion& c)
     std::vector<uint32_t> record(clip.header.size / 4, 0);
     auto* bytes = reinterpret_cast<uint8_t*>(record.data());
     memcpy(bytes, &clip.header, sizeof(ClipRecord));
-    memcpy(bytes + sizeof(ClipRecord), clip.objects.data(), clip.objects.size());
+    if (!clip.objects.empty())
+        memcpy(bytes + sizeof(ClipRecord), clip.objects.data(), clip.objects.size());
     const std::string id = clip.header.id.c_str();
     if (c.clips->count(id))
         OX_LOG(kChannel, diag::LogWarning, "%s: clip '%s' is given twice; the last one holds", c.name, id.c_str());
@@ -454,16 +455,23 @@ void OnAttributesDone(void* user, XmlRecord* stack, int depth)
 void OnEnd(void* user, XmlRecord*, int depth)
 {
     auto& c = *static_cast<Conversion*>(user);
+    // A broken document may close an outer element first: what was open inside it ends too.
     if (c.skipDepth >= 0) {
-        if (depth == c.skipDepth)
-            c.skipDepth = -1;
-        return;
+        if (depth > c.skipDepth)
+            return;
+        const bool skipped = depth == c.skipDepth;
+        c.skipDepth = -1;
+        if (skipped)
+            return;
     }
-    if (c.object && depth == c.object->depth) {
-        FinishObject(c);
+    if (c.object && depth <= c.object->depth) {
+        if (depth == c.object->depth)
+            FinishObject(c);
         c.object.reset();
-    } else if (c.clip && depth == c.clip->depth) {
-        FinishClip(c);
+    }
+    if (c.clip && depth <= c.clip->depth) {
+        if (depth == c.clip->depth)
+            FinishClip(c);
         c.clip.reset();
     }
 }

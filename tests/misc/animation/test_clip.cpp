@@ -306,6 +306,7 @@ TEST_F(ClipFixture, ObjectsThatCannotBeUsedAreLoggedAndLeftOut)
         <image id="late" i_id="tex" vis="true"><kp t="100"/><kp t="50"/></image>
         <image id="gone" i_id="nope" vis="true"><kp t="0"/></image>
         <image id="keyless" i_id="tex" vis="true"/>
+        <image id="far" i_id="tex" vis="true" at="2"><kp t="0"/><kp t="2000000000"/></image>
         <image id="hidden" i_id="tex"><kp t="0"/></image>
         <particle id="spark" p_id="sparks" vis="true"><kp t="0"/></particle>
         <path id="road" closed="1"><p a="0,0"/></path>
@@ -316,6 +317,7 @@ TEST_F(ClipFixture, ObjectsThatCannotBeUsedAreLoggedAndLeftOut)
     ASSERT_TRUE(clip.Load(loader, "bad"));
     EXPECT_EQ(clip.FindObject("late"), nullptr);
     EXPECT_EQ(clip.FindObject("keyless"), nullptr);
+    EXPECT_EQ(clip.FindObject("far"), nullptr) << "twice its period would not fit in 32 bits";
     EXPECT_EQ(clip.FindObject("hidden"), nullptr) << "invisible objects stay out of the game";
     ASSERT_NE(clip.FindObject("gone"), nullptr) << "kept, drawn without its texture";
     ASSERT_NE(clip.FindObject("spark"), nullptr);
@@ -324,9 +326,11 @@ TEST_F(ClipFixture, ObjectsThatCannotBeUsedAreLoggedAndLeftOut)
     EXPECT_TRUE(log.Contains("Clip 'bad': image object 'late' is left out: its key states are out of order at the "
                              "time (50)"));
     EXPECT_TRUE(log.Contains("Clip 'bad': image object 'keyless' is left out: it has no key state"));
+    EXPECT_TRUE(log.Contains("Clip 'bad': image object 'far' is left out: a key's time lies beyond twelve days"));
     EXPECT_TRUE(log.Contains("Clip 'bad': image object 'gone' names the unknown texture 'nope'"));
     EXPECT_TRUE(log.Contains("Clip 'bad': particle object 'spark' (system 'sparks') draws nothing"));
-    EXPECT_TRUE(log.Contains("Clip 'bad': clip object 'self' nests clips more than 8 deep"));
+    EXPECT_TRUE(log.Contains("Clip 'bad' holds itself through 'bad'; the inner one is left out"));
+    EXPECT_TRUE(log.Contains("Clip 'bad': clip object 'self' cannot show the clip 'bad'; left out"));
     EXPECT_FALSE(clip.Load(loader, "missing"));
 
     oxtest::RecordingBackend* backend = nullptr;
@@ -336,6 +340,43 @@ TEST_F(ClipFixture, ObjectsThatCannotBeUsedAreLoggedAndLeftOut)
     clip.Draw(renderer.get());
     renderer->Flush();
     EXPECT_TRUE(backend->draws.empty());
+}
+
+TEST_F(ClipFixture, NestingIsBoundedInDepthAndInObjects)
+{
+    // A chain of ten clips, each showing the next.
+    std::string chain;
+    for (int i = 0; i < 10; ++i)
+        chain += "<Clip id=\"c" + std::to_string(i) + "\" w=\"10\" h=\"10\"><clip id=\"v\" clip_id=\"c" +
+                 std::to_string(i + 1) + "\" vis=\"true\"><kp t=\"0\"/></clip></Clip>";
+    // Three levels of thirty: more objects than one clip may build.
+    auto views = [](const std::string& of) {
+        std::string xml;
+        for (int i = 0; i < 30; ++i)
+            xml += "<clip id=\"v" + std::to_string(i) + "\" clip_id=\"" + of + "\" vis=\"true\"><kp t=\"0\"/></clip>";
+        return xml;
+    };
+    std::string images;
+    for (int i = 0; i < 30; ++i)
+        images += "<image id=\"i" + std::to_string(i) + "\" i_id=\"tex\" vis=\"true\"><kp t=\"0\"/></image>";
+    Declare(chain + "<Clip id=\"wide\" w=\"1\" h=\"1\">" + views("wider") + "</Clip><Clip id=\"wider\" w=\"1\" h=\"1\">" +
+            views("leaf") + "</Clip><Clip id=\"leaf\" w=\"1\" h=\"1\">" + images + "</Clip>");
+    oxtest::LogCapture log;
+    CClip clip;
+    ASSERT_TRUE(clip.Load(loader, "c0"));
+    int depth = 0;
+    for (CClip* at = &clip; !at->GetObjects().empty(); ++depth)
+        at = &static_cast<CClipViewObject&>(*at->GetObjects()[0]).GetClip();
+    EXPECT_EQ(depth, 7) << "eight clips, c0 to c7; c7 without its view";
+    EXPECT_TRUE(log.Contains("Clip 'c8' is nested more than 8 deep in 'c7'; left out"));
+
+    ASSERT_TRUE(clip.Load(loader, "wide"));
+    size_t built = 0;
+    for (const auto& view : clip.GetObjects())
+        for (const auto& inner : static_cast<CClipViewObject&>(*view).GetClip().GetObjects())
+            built += 1 + static_cast<CClipViewObject&>(*inner).GetClip().GetObjects().size();
+    EXPECT_LE(built + clip.GetObjects().size(), kMaxClipObjects);
+    EXPECT_TRUE(log.Contains("Clip 'leaf': more than 20000 objects with its nested clips; the rest are left out"));
 }
 
 TEST_F(ClipFixture, UnknownObjectKindInADumpIsLeftOut)

@@ -272,6 +272,14 @@ TEST(ClipsLoader, XmlThatCannotBeUsedIsLoggedWithTheClipAndLeftOut)
     EXPECT_TRUE(log.Contains("bad.xml: clip 'many': object 'm' has more than 255 key states; 1 are left out"));
     const auto* many = reinterpret_cast<const ClipRecord*>(clips["many"].data());
     EXPECT_EQ(ObjectsBegin(many)->keypointsnum, 255);
+    // An object closed by "</>" (no end callback) is dropped when its clip ends; nothing of
+    // it reaches a later element.
+    const std::string anonymous = R"(<?xml version="1.0"?><clips><Clip id="a"><image id="i" vis="true"><kp t="0"/>
+        </></Clip><x><y></y></x><Clip id="b"/></clips>)";
+    ClipRecords closed;
+    ASSERT_TRUE(ConvertClipsXml(anonymous.data(), anonymous.size(), "anonymous.xml", closed));
+    ASSERT_EQ(closed.size(), 2u);
+    EXPECT_EQ(ObjectsBegin(reinterpret_cast<const ClipRecord*>(closed["a"].data())), nullptr);
     // A document that breaks off adds nothing.
     const std::string cut = xml.substr(0, 120);
     ClipRecords none;
