@@ -173,6 +173,7 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     };
     clips.fonts = [](const char* id) -> const graphics::CFont* { return core::CFontManager::Instance().GetItem(id); };
+    m_Demo->StartClip();
     return true;
 }
 
@@ -238,6 +239,8 @@ void CApp::DrawFps(graphics::CRenderer* renderer)
 
 void CApp::DoUpdate()
 {
+    if (m_Demo)
+        m_Demo->Update();
     if (m_Lua) {
         m_Lua->CheckFileChanges();
         // The script threads, once the scripts define their manager.

@@ -144,6 +144,8 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_EQ(log.find("[texman][3]"), std::string::npos) << log;
     // The clip declarations are read at start.
     EXPECT_NE(log.find("[anim][1]: Clips loaded"), std::string::npos) << log;
+    EXPECT_EQ(log.find("[anim][3]"), std::string::npos) << "the demo's clip loads whole:\n" << log;
+    EXPECT_EQ(log.find("[anim][2]"), std::string::npos) << log;
     EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
     EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
 }
