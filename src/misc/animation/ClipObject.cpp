@@ -310,6 +310,7 @@ void CClipObject::InterpolateStopped(int time)
         const KeyState& a = m_States[i];
         const KeyState& b = m_States[i + 1];
         if (a.t <= time && time <= b.t) {
+            OX_CHECK_DATA(!a.itpl || b.t > a.t);
             ApplyPiece(i, i + 1, a.itpl ? static_cast<float>(time - a.t) / static_cast<float>(b.t - a.t) : 0.0f);
             return;
         }
@@ -353,6 +354,8 @@ void CClipObject::InterpolatePlaying(int time)
                m_LastInterpolateTime, time);
         m_LastInterpolateTime = time - 1;
     }
+    // Key times edited out of order: a pass of the walk must take time, or it never ends.
+    OX_CHECK_DATA(m_States[n - 1].t > m_States[0].t);
     Walk walk {0, n - 1, 1, 0, 0};
     if (m_AnimationDirection == AnimationDirectionBackward) {
         std::swap(walk.first, walk.last);
@@ -380,6 +383,7 @@ void CClipObject::InterpolatePlaying(int time)
     if (prev >= 0 && prev < n) {
         const int delta = std::abs(m_States[walk.cursor].t - m_States[prev].t);
         const int64_t start = walk.base - delta;
+        OX_CHECK_DATA(delta > 0);
         if (time != start && m_States[prev].itpl)
             ApplyPiece(prev, walk.cursor, static_cast<float>(time - start) / static_cast<float>(delta));
     }

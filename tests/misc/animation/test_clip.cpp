@@ -394,6 +394,20 @@ TEST_F(ClipFixture, UnknownObjectKindInADumpIsLeftOut)
     EXPECT_TRUE(log.Contains("Clip 'odd': object 'o' is of the unknown kind 9; left out"));
 }
 
+TEST_F(ClipFixture, KeysEditedOutOfOrderAreADataErrorNotAHang)
+{
+    Declare(OneImage("loop", "at=\"1\"", kSteps));
+    CClip clip;
+    ASSERT_TRUE(clip.Load(loader, "loop"));
+    CClipObject& o = Object(clip);
+    o.FindKeyStateForEdit(100)->t = 0;
+    o.FindKeyStateForEdit(200)->t = 0;
+    oxtest::LogCapture log;
+    Run(clip, 100);
+    EXPECT_TRUE(log.Contains("[data][3]: check failed \"m_States[n - 1].t > m_States[0].t\""));
+    EXPECT_EQ(ObjectsBegin(loader.FindClip("loop"))->KeyStates()[2].t, 200) << "edits stay in the object";
+}
+
 TEST_F(ClipFixture, CopiedClipRunsApart)
 {
     Declare(OneImage("once", "", kRamp));
