@@ -1,6 +1,6 @@
 #!/bin/sh
-# Regenerates the demo game's textures and texture dumps with the content tools; the same
-# tools give the same bytes, so the files in this folder can be checked against a run.
+# Regenerates the demo game's textures, texture dumps and clips dump with the content tools;
+# the same tools give the same bytes, so the files in this folder can be checked against a run.
 #
 #   games/demo/make-textures.sh [TOOLS_DIR [OUT_DIR]]
 #
@@ -25,3 +25,4 @@ trap 'rm -rf "$scratch"' EXIT
 [ "$out" = "$here" ] || cp -r "$here/fonts" "$out/"
 "$tools/oxdump" resources "$here/properties/resources.xml" "$out/properties/resources.bindump" --root "$out" >/dev/null
 "$tools/oxdump" texturesalpha "$out/textures" "$out/properties/texturesalpha.bindump" >/dev/null
+"$tools/oxdump" clips "$here/properties/clips.xml" "$out/properties/clips.bindump" >/dev/null

@@ -10,6 +10,9 @@
 #include "lua/mluabind/StdBinding.h"
 #include "graphics/Font.h"
 #include "misc/Unicode.h"
+#include "misc/animation/Clip.h"
+#include "misc/animation/ClipServices.h"
+#include "misc/animation/ClipsLoader.h"
 #include "misc/sys/Path.h"
 
 #include <fcntl.h>
@@ -68,6 +71,7 @@ CApp::~CApp()
 {
     m_Demo.reset();
     core::CFontManager::Instance().SetTextureLookup(nullptr);
+    misc::anim::GetClipServices() = misc::anim::ClipServices();
     CloseOutput();
     m_GameFolder.clear();
     m_Lua.reset();
@@ -108,13 +112,13 @@ void CApp::BindScripts()
 
 bool CApp::Init()
 {
-    // Later subsystems join the start here, in this order: the clip loader's flag after the
-    // Lua heap size; the framework's, the game's and the quest engine's script vocabularies
-    // with the main script host; after the window the player's options, profiles, music and
-    // records before scripts/main.lua; after show_fps the particle and clip declarations;
-    // after the textures the sound declarations; after the fonts the quest data and the edit
-    // widget's forbidden characters.
+    // Later subsystems join the start here, in this order: the framework's, the game's and
+    // the quest engine's script vocabularies with the main script host; after the window the
+    // player's options, profiles, music and records before scripts/main.lua; after show_fps
+    // the particle declarations, before the clips; after the textures the sound declarations;
+    // after the fonts the quest data and the edit widget's forbidden characters.
     lua::SetLuaHeapSize(0x1400000);
+    misc::anim::g_LoadInvisibleObjects = false;
     auto adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
     m_Adapter = adapter.get();
     SetSystemIntegration(std::move(adapter));
@@ -152,6 +156,7 @@ bool CApp::Init()
     if (g_ShowFps)
         core::ReadWString(settings, "show_fps_font", g_ShowFpsFont);
 
+    misc::anim::CClipsLoader::Instance().Load();
     m_ResourceDeclarations.Load("properties/fonts.xml", nullptr);
     LoadTextures();
     m_Demo->TakeDeclaredTextures();
@@ -161,6 +166,13 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     });
     fonts.LoadGroup(m_ResourceDeclarations, nullptr);
+    // Clips draw the declared textures and fonts.
+    misc::anim::ClipServices& clips = misc::anim::GetClipServices();
+    clips.textures = [](const char* id) -> const graphics::CTexture* {
+        return core::CTextureManager::Instance().GetItem(id);
+    };
+    clips.fonts = [](const char* id) -> const graphics::CFont* { return core::CFontManager::Instance().GetItem(id); };
+    m_Demo->StartClip();
     return true;
 }
 
@@ -226,6 +238,8 @@ void CApp::DrawFps(graphics::CRenderer* renderer)
 
 void CApp::DoUpdate()
 {
+    if (m_Demo)
+        m_Demo->Update();
     if (m_Lua) {
         m_Lua->CheckFileChanges();
         // The script threads, once the scripts define their manager. Their absence is

@@ -68,6 +68,14 @@ void CDemoScene::TakeDeclaredTextures()
     m_Frame.SetFlags(graphics::CImage::FlagBoxImage);
 }
 
+void CDemoScene::StartClip()
+{
+    if (m_Clip.Load("demo_show"))
+        m_Clip.SetPos({790, 400});
+}
+
+void CDemoScene::Update() { m_Clip.Update(); }
+
 void CDemoScene::ReleaseDeviceResources(bool forReset)
 {
     if (!forReset)
@@ -130,6 +138,7 @@ void CDemoScene::Draw(graphics::CRenderer& r, unsigned timeMs)
     m_Disc.Draw(r);
     m_Stone.Draw(r);
     m_Frame.Draw(r);
+    m_Clip.Draw(&r);
     DrawText(r, t);
 }
 

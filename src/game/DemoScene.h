@@ -4,6 +4,7 @@
 #include "graphics/Image.h"
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
+#include "misc/animation/Clip.h"
 
 #include <memory>
 #include <vector>
@@ -19,6 +20,10 @@ public:
     void ReleaseDeviceResources(bool forReset) override;
     // Looks up the game's declared textures (once they are loaded) for the shelf of images.
     void TakeDeclaredTextures();
+    // Starts the authored clip, once clips find their textures and fonts.
+    void StartClip();
+    // Once per frame: the clip's time lines.
+    void Update();
 
 private:
     // Text in the demo's fonts, when they are loaded.
@@ -34,6 +39,8 @@ private:
     ox::graphics::CImage m_Disc;
     ox::graphics::CImage m_Stone;
     ox::graphics::CImage m_Frame;
+    // The authored clip demo_show (properties/clips.xml).
+    ox::misc::anim::CClip m_Clip;
 };
 
 } // namespace k17

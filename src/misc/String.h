@@ -105,4 +105,17 @@ static_assert(sizeof(StringW28) == 64);
 static_assert(sizeof(StringW124) == 256);
 static_assert(sizeof(StringW60) == 8 + 60 * 2);
 
+// A fixed string read from a file can be used in place: its capacity as declared, its size
+// inside it, its text terminated where the size says and free of zeros before that.
+template <class C, size_t N>
+bool IsStoredStringValid(const String<C, N>& s)
+{
+    if (s.max_size != N || s.size >= N || s.m_Data[s.size] != 0)
+        return false;
+    for (size_t i = 0; i < s.size; ++i)
+        if (s.m_Data[i] == 0)
+            return false;
+    return true;
+}
+
 } // namespace ox::misc

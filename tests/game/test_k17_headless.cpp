@@ -150,6 +150,10 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     // The declared textures are known, and none of them failed to load.
     EXPECT_NE(log.find("[texman][0]: Texture information created in"), std::string::npos) << log;
     EXPECT_EQ(log.find("[texman][3]"), std::string::npos) << log;
+    // The clip declarations are read at start.
+    EXPECT_NE(log.find("[anim][1]: Clips loaded"), std::string::npos) << log;
+    EXPECT_EQ(log.find("[anim][3]"), std::string::npos) << "the demo's clip loads whole:\n" << log;
+    EXPECT_EQ(log.find("[anim][2]"), std::string::npos) << log;
     EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
     EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
 }

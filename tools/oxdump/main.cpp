@@ -4,6 +4,8 @@
 #include "core/TexturesAlpha.h"
 #include "core/TexturesAlphaWriter.h"
 #include "common/LogToStderr.h"
+#include "misc/animation/ClipFormat.h"
+#include "oxdump/Clips.h"
 #include "diag/Log.h"
 #include "misc/sys/Path.h"
 #include "misc/GamePack.h"
@@ -31,6 +33,7 @@ const char* kUsage =
     "                                                    compile the texture declarations\n"
     "       oxdump texturesalpha <folder|list> <out> [--order auto|rows|columns]\n"
     "                                                    build the alpha-mask table\n"
+    "       oxdump clips <clips.xml|folder> <out>        compile the clips\n"
     "       oxdump show <file.bindump>                   print the records of a dump\n"
     "       oxdump COMMAND --help                        details of one command\n";
 
@@ -66,8 +69,8 @@ const char* kShowHelp =
     "usage: oxdump show <file.bindump>\n"
     "\n"
     "Checks a binary dump as the game would and prints its records: texture declarations\n"
-    "(resources.bindump), alpha masks (texturesalpha.bindump) and string tables\n"
-    "(strings.bindump, strings.xml.bin_utf16le, strings.xml.bin_utf32le).\n";
+    "(resources.bindump), alpha masks (texturesalpha.bindump), clips (clips.bindump) and\n"
+    "string tables (strings.bindump, strings.xml.bin_utf16le, strings.xml.bin_utf32le).\n";
 
 int UsageError(const std::string& message, const char* usage = kUsage)
 {
@@ -372,6 +375,8 @@ int Show(int argc, char** argv)
         ox::core::CTexturesAlpha store;
         if ((ok = store.LoadFromMemory(data, size, path.c_str())))
             ShowAlpha(store);
+    } else if (magic == ox::misc::anim::kClipsMagic) {
+        ok = oxdump::ShowClips(data, size, path.c_str());
     } else if (memcmp(data, "S16\x01", 4) == 0 || memcmp(data, "S16L", 4) == 0) {
         CStringTable table;
         if ((ok = table.UseTable(data, size, path.c_str())))
@@ -416,6 +421,7 @@ int main(int argc, char** argv)
         {"strings", Strings, kStringsHelp},
         {"resources", Resources, kResourcesHelp},
         {"texturesalpha", TexturesAlpha, kTexturesAlphaHelp},
+        {"clips", oxdump::Clips, oxdump::kClipsHelp},
         {"show", Show, kShowHelp},
     };
     for (const Command& c : commands) {
