@@ -2,55 +2,15 @@
 // it is given: the cost of the renderer, the state, the clipper and the batch alone.
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
+#include "NullBackend.h"
 
 #include <benchmark/benchmark.h>
 
 using namespace ox::graphics;
 using ox::misc::FloatRect;
+using oxbench::NullBackend;
 
 namespace {
-
-class NullBackend : public IRenderBackend {
-public:
-    CDeviceTexture texture;
-    unsigned long long vertices = 0;
-
-    DeviceResult CreateDevice(void*, unsigned, unsigned, bool) override { return (device = true), ResultOk; }
-    DeviceResult ResetDevice(unsigned, unsigned, bool) override { return ResultOk; }
-    bool HasDevice() const override { return device; }
-    void ReleaseDevice(bool forReset) override { device = device && forReset; }
-    DeviceResult TestCooperativeLevel() override { return ResultOk; }
-    void EnumModes(ResolutionsT&) override {}
-    DeviceResult BeginScene() override { return ResultOk; }
-    DeviceResult EndScene() override { return ResultOk; }
-    DeviceResult Present() override { return ResultOk; }
-    void Clear(uint32_t) override {}
-    bool CreateEventQuery() override { return false; }
-    bool PollEventQuery() override { return true; }
-    void ReleaseEventQuery() override {}
-    void SetRenderState(uint32_t, uint32_t) override {}
-    void SetTextureStageState(unsigned, uint32_t, uint32_t) override {}
-    void SetSamplerState(unsigned, uint32_t, uint32_t) override {}
-    void SetTexture(unsigned, CDeviceTexture*) override {}
-    DeviceResult SetRenderTarget(CDeviceTexture*) override { return ResultOk; }
-    void SetPixelShader(CDeviceShader*) override {}
-    DeviceResult DrawPrimitiveUP(PrimitiveType, unsigned, const Vertex* v, unsigned count) override
-    {
-        benchmark::DoNotOptimize(v);
-        vertices += count;
-        return ResultOk;
-    }
-    CDeviceTexture* CreateTexture(unsigned, unsigned, uint8_t, bool) override { return &texture; }
-    void ReleaseTexture(CDeviceTexture*) override {}
-    DeviceResult LoadBits(CDeviceTexture*, const void*, size_t) override { return ResultOk; }
-    DeviceResult ReadTexture(CDeviceTexture*, uint32_t*) override { return ResultOk; }
-    DeviceResult ReadBackBuffer(const ox::misc::IntRect&, uint32_t*) override { return ResultOk; }
-    CDeviceShader* CreatePixelShader(const std::string&, std::string&) override { return nullptr; }
-    void ReleasePixelShader(CDeviceShader*) override {}
-
-private:
-    bool device = false;
-};
 
 struct Scene {
     NullBackend* backend;
