@@ -61,6 +61,9 @@ CBaseWidget::~CBaseWidget()
     // A box that outlives its widget in its parent's tree must not reach back to it.
     if (m_LayoutBox)
         m_LayoutBox->DetachWidget();
+    // Nor may a child that someone else still holds.
+    for (const WidgetPtrT& child : m_ChildWidgets)
+        child->ClearParentWidget();
 }
 
 void CBaseWidget::SetDebugRender(bool on) { g_DebugRender = on; }

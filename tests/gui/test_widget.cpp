@@ -143,6 +143,10 @@ TEST_F(WidgetTree, DeadWidgetLeavesAtTheParentsNextUpdate)
     root->RemoveAllWidgets();
     EXPECT_TRUE(root->GetWidgets().empty());
     EXPECT_EQ(killer->GetParentWidget(), nullptr);
+    // A child held elsewhere outlives its parent without a link to it.
+    root->AddWidget(killer);
+    root.reset();
+    EXPECT_EQ(killer->GetParentWidget(), nullptr);
 }
 
 TEST_F(WidgetTree, BroadcastPassReachesWhoAskedOnly)
