@@ -161,6 +161,8 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     });
     fonts.LoadGroup(m_ResourceDeclarations, nullptr);
+    gui::CBaseWidget::SetDebugRender(core::ReadBool(settings, "debug_render"));
+    m_Demo->LoadPanel(m_Settings.GetChild("gui"), m_Settings.GetChild("GUITemplates"));
     return true;
 }
 
@@ -241,6 +243,8 @@ void CApp::DoUpdate()
             OX_LOG("lua", diag::LogWarning, "the script function ManageThreads is missing: script threads do not run");
         m_ManageThreadsReported = !present;
     }
+    if (m_Demo)
+        m_Demo->Update(m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
     CApplication::DoUpdate();
 }
 

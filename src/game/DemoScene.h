@@ -4,6 +4,7 @@
 #include "graphics/Image.h"
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
+#include "gui/Widget.h"
 
 #include <memory>
 #include <vector>
@@ -19,6 +20,10 @@ public:
     void ReleaseDeviceResources(bool forReset) override;
     // Looks up the game's declared textures (once they are loaded) for the shelf of images.
     void TakeDeclaredTextures();
+    // Builds the panel of boxes that `gui` describes (element id "demo_panel") and lays it out.
+    void LoadPanel(const ox::core::CSettingsGroup& gui, const ox::core::CSettingsGroup& templates);
+    // The panel's frame: its width breathes, so the boxes share out the room again.
+    void Update(unsigned timeMs);
 
 private:
     // Text in the demo's fonts, when they are loaded.
@@ -34,6 +39,8 @@ private:
     ox::graphics::CImage m_Disc;
     ox::graphics::CImage m_Stone;
     ox::graphics::CImage m_Frame;
+    ox::gui::WidgetPtrT m_Panel;
+    float m_PanelWidth = 0;
 };
 
 } // namespace k17
