@@ -3,6 +3,7 @@
 #include "NullBackend.h"
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
+#include "NullBackend.h"
 
 #include <benchmark/benchmark.h>
 

@@ -173,6 +173,8 @@ bool CApp::Init()
     };
     clips.fonts = [](const char* id) -> const graphics::CFont* { return core::CFontManager::Instance().GetItem(id); };
     m_Demo->StartClip();
+    gui::CBaseWidget::SetDebugRender(core::ReadBool(settings, "debug_render"));
+    m_Demo->LoadPanel(m_Settings.GetChild("gui"), m_Settings.GetChild("GUITemplates"));
     return true;
 }
 
@@ -238,8 +240,6 @@ void CApp::DrawFps(graphics::CRenderer* renderer)
 
 void CApp::DoUpdate()
 {
-    if (m_Demo)
-        m_Demo->Update();
     if (m_Lua) {
         m_Lua->CheckFileChanges();
         // The script threads, once the scripts define their manager. Their absence is
@@ -255,6 +255,8 @@ void CApp::DoUpdate()
             OX_LOG("lua", diag::LogWarning, "the script function ManageThreads is missing: script threads do not run");
         m_ManageThreadsReported = !present;
     }
+    if (m_Demo)
+        m_Demo->Update(m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
     CApplication::DoUpdate();
 }
 

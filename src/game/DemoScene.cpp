@@ -1,7 +1,9 @@
 #include "game/DemoScene.h"
 
 #include "core/FontManager.h"
+#include "core/SettingsReaders.h"
 #include "graphics/Font.h"
+#include "gui/WidgetFactory.h"
 #include "misc/StringTable.h"
 
 #include <cmath>
@@ -34,6 +36,34 @@ std::vector<uint32_t> MakeTile()
         }
     return pixels;
 }
+
+// A box of the demo's panel: a filled rectangle (`fill`, "#a r g b") with an outline and an
+// optional caption in the small font. Its colour stays white, so its children keep theirs.
+class CDemoBoxWidget : public gui::CWidget {
+public:
+    void Load(const core::CSettingsGroup& node, const core::CSettingsGroup& templates) override
+    {
+        CWidget::Load(node, templates);
+        core::ReadColor(node, "fill", m_Fill);
+        m_Caption = core::ReadLocalText(node, "caption");
+    }
+
+    void DoDraw(graphics::CRenderer& r) override
+    {
+        const FloatRect rect(0, 0, GetSize().X, GetSize().Y);
+        r.RenderFilledPoly4(misc::RectToPoly4(rect), m_Fill);
+        r.RenderRect(rect, Color(0x80FFFFFFu));
+        const graphics::CFont* font = core::CFontManager::Instance().GetItem("small");
+        if (font && !m_Caption.empty())
+            r.RenderString(font, m_Caption, rect.Width / 2, rect.Height / 2, graphics::JustifyCenterH,
+                           graphics::JustifyCenterV, 1.0f, Color(0xFF101010u));
+        CWidget::DoDraw(r);
+    }
+
+private:
+    Color m_Fill {0xFF808080u};
+    wstring m_Caption;
+};
 
 } // namespace
 
@@ -74,7 +104,25 @@ void CDemoScene::StartClip()
         m_Clip.SetPos({790, 400});
 }
 
-void CDemoScene::Update() { m_Clip.Update(); }
+void CDemoScene::LoadPanel(const core::CSettingsGroup& gui, const core::CSettingsGroup& templates)
+{
+    gui::CWidgetFactory& factory = gui::GetWidgetFactory();
+    factory.RegisterWidget<CDemoBoxWidget>("demo_box_widget");
+    m_Panel = factory.Create("demo_box_widget", gui.GetChildByAttribute("demo_box_widget", "id", "demo_panel"),
+                             templates);
+    m_Panel->UpdateLayout();
+    m_PanelWidth = m_Panel->GetSize().X;
+}
+
+void CDemoScene::Update(unsigned timeMs)
+{
+    m_Clip.Update();
+    if (!m_Panel)
+        return;
+    const float breath = 0.5f + 0.5f * std::sin(timeMs / 1000.0f);
+    m_Panel->SetSize(m_PanelWidth + 80 * breath, m_Panel->GetSize().Y);
+    m_Panel->Update();
+}
 
 void CDemoScene::ReleaseDeviceResources(bool forReset)
 {
@@ -140,6 +188,8 @@ void CDemoScene::Draw(graphics::CRenderer& r, unsigned timeMs)
     m_Frame.Draw(r);
     m_Clip.Draw(&r);
     DrawText(r, t);
+    if (m_Panel)
+        m_Panel->Draw(r);
 }
 
 void CDemoScene::DrawText(graphics::CRenderer& r, float t)

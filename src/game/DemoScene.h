@@ -5,6 +5,7 @@
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
 #include "misc/animation/Clip.h"
+#include "gui/Widget.h"
 
 #include <memory>
 #include <vector>
@@ -22,8 +23,11 @@ public:
     void TakeDeclaredTextures();
     // Starts the authored clip, once clips find their textures and fonts.
     void StartClip();
-    // Once per frame: the clip's time lines.
-    void Update();
+    // Builds the panel of boxes that `gui` describes (element id "demo_panel") and lays it out.
+    void LoadPanel(const ox::core::CSettingsGroup& gui, const ox::core::CSettingsGroup& templates);
+    // Once per frame: the clip's time lines, and the panel whose width breathes, so the boxes
+    // share out the room again.
+    void Update(unsigned timeMs);
 
 private:
     // Text in the demo's fonts, when they are loaded.
@@ -41,6 +45,8 @@ private:
     ox::graphics::CImage m_Frame;
     // The authored clip demo_show (properties/clips.xml).
     ox::misc::anim::CClip m_Clip;
+    ox::gui::WidgetPtrT m_Panel;
+    float m_PanelWidth = 0;
 };
 
 } // namespace k17

@@ -49,6 +49,16 @@ inline FloatMatrix MatrixRotation(float angle)
     return {c, s, 0, -s, c, 0, 0, 0, 1};
 }
 
+// The inverse of an affine transform (last column 0, 0, 1); a singular one gives the identity.
+constexpr FloatMatrix MatrixInverse(const FloatMatrix& a)
+{
+    const float det = a.m[0][0] * a.m[1][1] - a.m[0][1] * a.m[1][0];
+    if (det == 0.0f)
+        return {};
+    const float i00 = a.m[1][1] / det, i01 = -a.m[0][1] / det, i10 = -a.m[1][0] / det, i11 = a.m[0][0] / det;
+    return {i00, i01, 0, i10, i11, 0, -(a.m[2][0] * i00 + a.m[2][1] * i10), -(a.m[2][0] * i01 + a.m[2][1] * i11), 1};
+}
+
 constexpr FloatMatrix MatrixTranslation(float x, float y) { return {1, 0, 0, 0, 1, 0, x, y, 1}; }
 constexpr FloatMatrix MatrixScale(float x, float y) { return {x, 0, 0, 0, y, 0, 0, 0, 1}; }
 

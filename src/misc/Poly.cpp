@@ -4,6 +4,20 @@
 
 namespace ox::misc {
 
+bool IsInside(const Poly4& p, const Vector<float>& point)
+{
+    auto cross = [&](int i) {
+        const Vector<float>& a = p[i];
+        const Vector<float>& b = p[(i + 1) % 4];
+        return (b.X - a.X) * (point.Y - a.Y) - (b.Y - a.Y) * (point.X - a.X);
+    };
+    const float first = cross(0);
+    for (int i = 0; i < 4; ++i)
+        if (first * (i == 0 ? first : cross(i)) < 0.001f)
+            return false;
+    return true;
+}
+
 Vector<float> Poly4ConvertToLocalPos(const Poly4& p, const Vector<float>& pos)
 {
     double u = 0.5, v = 0.5;

@@ -39,6 +39,11 @@ constexpr Vector<float> Poly4ConvertToAbsPos(const Poly4& p, const Vector<float>
             w0 * p[0].Y + w1 * p[1].Y + w2 * p[2].Y + w3 * p[3].Y};
 }
 
+// Whether a point lies strictly inside a convex quad of either winding: for every edge, the cross
+// product of the edge with the point has the sign of the first edge's, their product being at
+// least 0.001. Points on an edge are outside.
+bool IsInside(const Poly4& poly, const Vector<float>& point);
+
 // The inverse of Poly4ConvertToAbsPos: the local (u, v) of a point, by Newton steps on the
 // bilinear map (exact in one step for parallelograms).
 Vector<float> Poly4ConvertToLocalPos(const Poly4& p, const Vector<float>& pos);
