@@ -14,6 +14,7 @@
 #include "misc/animation/ClipServices.h"
 #include "misc/animation/ClipsLoader.h"
 #include "misc/sys/Path.h"
+#include "quest/QuestBinding.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -101,12 +102,14 @@ void CApp::CloseOutput()
     m_OutputRedirected = false;
 }
 
-// The script vocabulary that exists so far: std strings, the Lua host and the file watcher.
+// The script vocabulary that exists so far: std strings, the Lua host and the file watcher,
+// then the quest tree.
 void CApp::BindScripts()
 {
     m_Lua->BeginBinding();
     m_Lua->Bind(mluabind::BindStdStrings());
     m_Lua->Bind(mluabind::Namespace("ox").Merge(lua::BindFileWatcher()).Merge(lua::BindLuaClasses()));
+    m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
 

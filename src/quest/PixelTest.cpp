@@ -1,6 +1,7 @@
 #include "quest/PixelTest.h"
 
 #include "core/TexturesAlpha.h"
+#include "graphics/Image.h"
 #include "graphics/Texture.h"
 
 namespace qe {
@@ -18,6 +19,12 @@ bool IsSolidPixel(const ox::graphics::CTexture& texture, const char* id, int x, 
         surface->LoadBuffer();
     }
     return (texture.Pixel(x, y, frame) >> 24) != 0;
+}
+
+bool TryAlpha(const ox::graphics::CImage& image, int x, int y)
+{
+    const ox::graphics::CTexture* texture = image.GetTexture();
+    return texture && IsSolidPixel(*texture, "", x, y, image.GetCurrentFrame(), nullptr);
 }
 
 } // namespace qe

@@ -4,6 +4,7 @@ namespace ox::core {
 class CTexturesAlpha;
 }
 namespace ox::graphics {
+class CImage;
 class CTexture;
 }
 
@@ -14,5 +15,9 @@ namespace qe {
 // at the first need: solid when its alpha is not 0. Outside the frame nothing is solid.
 bool IsSolidPixel(const ox::graphics::CTexture& texture, const char* id, int x, int y, int frame,
                   const ox::core::CTexturesAlpha* masks);
+
+// The pixel (x, y) of the image's texture in its current frame has an alpha other than 0;
+// the pixel copy is made on demand. False without a texture.
+bool TryAlpha(const ox::graphics::CImage& image, int x, int y);
 
 } // namespace qe

@@ -1,0 +1,248 @@
+#include "quest/QuestBinding.h"
+
+#include "graphics/Renderer.h"
+#include "lua/mluabind/StdBinding.h"
+#include "misc/animation/ClipObjects.h"
+#include "quest/Area.h"
+#include "quest/ClipObject.h"
+#include "quest/ImageObject.h"
+#include "quest/PixelTest.h"
+#include "quest/Quest.h"
+#include "quest/SceneGroup.h"
+
+namespace qe {
+
+namespace {
+
+using mluabind::Class;
+using B = CBaseSceneObject;
+
+mluabind::i::CCl<CBaseSceneObject>& BaseSceneObjectClass()
+{
+    return Class<B>("CBaseSceneObject")
+        .BaseClass<CTreeNode>()
+        .Method("GetPos", &B::GetPos)
+        .Method("GetSize", &B::GetSize)
+        .Method("GetAngle", &B::GetAngle)
+        .Method("GetColor", &B::GetColor)
+        .Method("GetId", &B::GetId)
+        .Method("GetIdRef", [](const B& o) { return o.GetIdRef(); })
+        .Method("GetHint", &B::GetHint)
+        .Method("SetPos", &B::SetPos)
+        .Method("SetSize", &B::SetSize)
+        .Method("SetAngle", &B::SetAngle)
+        .Method("SetColor", &B::SetColor)
+        .Method("SetId", &B::SetId)
+        .Method("SetHint", &B::SetHint)
+        .Method("Update", &B::Update)
+        .Method("Draw", &B::Draw)
+        .Method("DrawGame", &B::DrawGame)
+        .Method("DoDrawForEditor", &B::DoDrawForEditor)
+        .Method("GetPoly", &B::GetPoly)
+        .Method("GetType", &B::GetType)
+        .Method("GetParentGroup", &B::GetParentGroup)
+        .Method("SetParentGroup", &B::SetParentGroup)
+        .Method("IsParentGroupVisible", &B::IsParentGroupVisible)
+        .Method("RaiseFlag", &B::RaiseFlag)
+        .Method("ClearFlag", &B::ClearFlag)
+        .Method("ReadFlag", &B::ReadFlag)
+        .Method("GetFlags", &B::GetFlags)
+        .Method("SetFlags", &B::SetFlags)
+        .Method("RaiseObjectFlag", &B::RaiseObjectFlag)
+        .Method("ClearObjectFlag", &B::ClearObjectFlag)
+        .Method("ReadObjectFlag", &B::ReadObjectFlag)
+        .Method("GetObjectFlags", &B::GetObjectFlags)
+        .Method("SetObjectFlags", &B::SetObjectFlags)
+        .Method("GetLuaScript", [](const B& o, int kind) { return o.GetLuaScript(kind); })
+        .Method("SetLuaScript", &B::SetLuaScript)
+        .Method("Clone", &B::Clone)
+        .Constant("FlagSelected", B::FlagSelected)
+        .Constant("FlagNoDrag", B::FlagNoDrag)
+        .Constant("FlagInvisible", B::FlagInvisible)
+        .Constant("FlagExpanded", B::FlagExpanded)
+        .Constant("ScriptMouseClick", B::ScriptMouseClick)
+        .Constant("ScriptMouseEnter", B::ScriptMouseEnter)
+        .Constant("ScriptMouseLeave", B::ScriptMouseLeave)
+        .Constant("ScriptInventoryClick", B::ScriptInventoryClick)
+        .Constant("ScriptCount", B::ScriptCount)
+        .Constant("ObjectFlagDisable", B::ObjectFlagDisable)
+        .Constant("ObjectFlagHidden", B::ObjectFlagHidden)
+        .Constant("ObjectFlagRemoved", B::ObjectFlagRemoved)
+        .Constant("ObjectFlagDoNotNeed", B::ObjectFlagDoNotNeed)
+        .Constant("ObjectCanAlwaysTake", B::ObjectCanAlwaysTake)
+        .Constant("ObjectType", B::ObjectType)
+        .Constant("GroupType", B::GroupType);
+}
+
+mluabind::Namespace SceneObjectClasses()
+{
+    mluabind::Namespace ns;
+    ns.AddClass(Class<CSceneGroup>("CSceneGroup")
+                    .BaseClass<B>()
+                    .Constructor<>()
+                    .Method("InsertChild", &CSceneGroup::InsertChild)
+                    .Method("RemoveChild", &CSceneGroup::RemoveChild)
+                    .Method("EnumChilds", &CSceneGroup::EnumChilds)
+                    .Method("GetChilds", &CSceneGroup::GetChilds)
+                    .Method("GetStateById", &CSceneGroup::GetStateById)
+                    .Method("FindState", &CSceneGroup::FindState)
+                    .Method("IsCurrent", &CSceneGroup::IsCurrent)
+                    .Method("GetFirstVisibleState", &CSceneGroup::GetFirstVisibleState)
+                    .Method("SetCurrent", &CSceneGroup::SetCurrent)
+                    .Method("SetCurrentByNumber", &CSceneGroup::SetCurrentByNumber));
+    ns.AddClass(Class<CSceneObject>("CSceneObject")
+                    .BaseClass<B>()
+                    .Method("GetSound", [](const CSceneObject& o) { return o.GetSound(); })
+                    .Method("SetSound", &CSceneObject::SetSound));
+    // SetPos of two numbers hides the base's, so both forms stand here.
+    ns.AddClass(Class<CObject>("CObject")
+                    .BaseClass<CSceneObject>()
+                    .Method("SetPos", static_cast<void (CObject::*)(const FloatVector&)>(&CObject::SetPos))
+                    .Method("SetPos", static_cast<void (CObject::*)(float, float)>(&CObject::SetPos)));
+    ns.AddClass(Class<CAreaPoint>("CAreaPoint")
+                    .Constructor<>()
+                    .Method("GetPos", &CAreaPoint::GetPos)
+                    .Method("SetPos", &CAreaPoint::SetPos));
+    ns.AddClass(Class<CImageObject>("CImageObject")
+                    .BaseClass<CObject>()
+                    .Constructor<>()
+                    .Method("SetTextureId", &CImageObject::SetTextureId)
+                    .Method("PlayFromStart", &CImageObject::PlayFromStart)
+                    .Method("GetTotalTime", &CImageObject::GetTotalTime));
+    ns.AddClass(Class<CClipObject>("CClipObject")
+                    .BaseClass<CObject>()
+                    .Constructor<>()
+                    .Method("SetClipId", &CClipObject::SetClipId)
+                    .Method("GetClipTime", &CClipObject::GetClipTime)
+                    .Method("Play", &CClipObject::Play)
+                    .Method("Stop", &CClipObject::Stop)
+                    .Method("Pause", &CClipObject::Pause)
+                    .Method("DisableSounds", &CClipObject::DisableSounds)
+                    .Method("UseAlpha", &CClipObject::UseAlpha)
+                    .Method("IsUsingAlpha", &CClipObject::IsUsingAlpha));
+    ns.AddClass(Class<CArea>("CArea")
+                    .BaseClass<CSceneObject>()
+                    .Constructor<>()
+                    .Method("PointIsNearToContour", &CArea::PointIsNearToContour)
+                    .Method("UpdatePosition", &CArea::UpdatePosition)
+                    .Method("InsertPoint", &CArea::InsertPoint)
+                    .Method("RemovePoint", &CArea::RemovePoint)
+                    .Method("EnumPoints", &CArea::EnumPoints)
+                    .Method("GetPoints", &CArea::GetPoints));
+    return ns;
+}
+
+mluabind::Namespace TreeClasses()
+{
+    mluabind::Namespace ns;
+    ns.AddClass(Class<CQuest>("CQuest")
+                    .BaseClass<CTreeNode>()
+                    .Constructor<>()
+                    .Method("EnumLevels", &CQuest::EnumLevels)
+                    .Method("GetLevels", &CQuest::GetLevels)
+                    .Method("GetLevelById", &CQuest::GetLevelById)
+                    .Method("InsertLevel", &CQuest::InsertLevel)
+                    .Method("RemoveLevel", &CQuest::RemoveLevel));
+    ns.AddClass(Class<CLevel>("CLevel")
+                    .BaseClass<CTreeNode>()
+                    .Constructor<>()
+                    .Method("GetId", [](const CLevel& l) { return l.GetId(); })
+                    .Method("SetId", &CLevel::SetId)
+                    .Method("EnumScenes", &CLevel::EnumScenes)
+                    .Method("GetScenes", &CLevel::GetScenes)
+                    .Method("GetSceneById", &CLevel::GetSceneById)
+                    .Method("InsertScene", &CLevel::InsertScene)
+                    .Method("RemoveScene", &CLevel::RemoveScene)
+                    .Method("GetSound", [](const CLevel& l, int index) { return l.GetSound(index); })
+                    .Method("SetSound", &CLevel::SetSound)
+                    .Method("GetLuaScript", [](const CLevel& l, int index) { return l.GetLuaScript(index); })
+                    .Method("SetLuaScript", &CLevel::SetLuaScript)
+                    .Method("RunLevelScript", &CLevel::RunLevelScript)
+                    .Method("RunStartLevelScript", &CLevel::RunStartLevelScript)
+                    .Method("GetShowChildSceneAreas", &CLevel::GetShowChildSceneAreas)
+                    .Method("SetShowChildSceneAreas", &CLevel::SetShowChildSceneAreas)
+                    .Method("UpdateHint", &CLevel::UpdateHint)
+                    .Method("UpdateFocusedObject", &CLevel::UpdateFocusedObject)
+                    .Method("FindObjectById", &CLevel::FindObjectById)
+                    .Method("RemoveObject", &CLevel::RemoveObject)
+                    .Method("ClearObjectsList", &CLevel::ClearObjectsList)
+                    .Method("Clone", &CLevel::Clone)
+                    .Method("UpdateLinks", &CLevel::UpdateLinks)
+                    .Constant("ScriptLevel", CLevel::ScriptLevel)
+                    .Constant("ScriptStart", CLevel::ScriptStart)
+                    .Constant("ScriptCount", CLevel::ScriptCount)
+                    .Constant("SoundMovingToABox", CLevel::SoundMovingToABox)
+                    .Constant("SoundOpenScene", CLevel::SoundOpenScene));
+    ns.AddClass(Class<CScene>("CScene")
+                    .BaseClass<CTreeNode>()
+                    .Constructor<>()
+                    .Method("Draw", &CScene::Draw)
+                    .Method("DrawInEditor", &CScene::DrawInEditor)
+                    .Method("DrawGame", &CScene::DrawGame)
+                    .Method("Update", &CScene::Update)
+                    .Method("GetOffset", &CScene::GetOffset)
+                    .Method("SetOffset", &CScene::SetOffset)
+                    .Method("GetId", [](const CScene& s) { return s.GetId(); })
+                    .Method("SetId", &CScene::SetId)
+                    .Method("GetSize", &CScene::GetSize)
+                    .Method("SetSize", &CScene::SetSize)
+                    .Method("ReadFlag", &CScene::ReadFlag)
+                    .Method("RaiseFlag", &CScene::RaiseFlag)
+                    .Method("ClearFlag", &CScene::ClearFlag)
+                    .Method("GetFlags", &CScene::GetFlags)
+                    .Method("SetFlags", &CScene::SetFlags)
+                    .Method("GetScript", [](const CScene& s) { return s.GetScript(); })
+                    .Method("SetScript", &CScene::SetScript)
+                    .Method("RunSceneScript", &CScene::RunSceneScript)
+                    .Method("GetParentLevel", &CScene::GetParentLevel)
+                    .Method("SetParentLevel", &CScene::SetParentLevel)
+                    .Method("EnumObjects", &CScene::EnumObjects)
+                    .Method("GetObjects", &CScene::GetObjects)
+                    .Method("InsertObject", &CScene::InsertObject)
+                    .Method("RemoveObject", &CScene::RemoveObject)
+                    .Method("EnumAreas", &CScene::EnumAreas)
+                    .Method("GetAreas", &CScene::GetAreas)
+                    .Method("InsertArea", &CScene::InsertArea)
+                    .Method("RemoveArea", &CScene::RemoveArea)
+                    .Method("EnumChilds", &CScene::EnumChilds)
+                    .Method("GetChilds", &CScene::GetChilds)
+                    .Method("UpdateTotalChildList", &CScene::UpdateTotalChildList)
+                    .Method("IsContentObject", &CScene::IsContentObject)
+                    .Method("IsContentArea", &CScene::IsContentArea)
+                    .Constant("FlagMainScene", CScene::FlagMainScene)
+                    .Constant("FlagSceneInNewWindow", CScene::FlagSceneInNewWindow));
+    return ns;
+}
+
+// The pointer classes and the walks over the lists. A scene's lists and a group's states
+// are one list type: CSceneGroup.GroupChildIteratorT walks both.
+mluabind::Namespace PointersAndWalks()
+{
+    mluabind::Namespace ns;
+    ns.AddClass(mluabind::IntrusivePtrClass<CAreaPoint>("CAreaPointPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CBaseSceneObject>("CBaseSceneObjectPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CLevel>("CLevelPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CSceneGroup>("CSceneGroupPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CScene>("CScenePtrT"));
+    ns.AddClass(mluabind::GenericIteratorClass<CQuest::LevelsListT>("CQuest.LevelIteratorT"));
+    ns.AddClass(mluabind::GenericIteratorClass<CLevel::ScenesListT>("CLevel.SceneIteratorT"));
+    ns.AddClass(mluabind::GenericIteratorClass<CArea::PointsListT>("CArea.PointIteratorT"));
+    ns.AddClass(mluabind::GenericIteratorClass<CSceneGroup::ChildsListT>("CSceneGroup.GroupChildIteratorT"));
+    return ns;
+}
+
+} // namespace
+
+mluabind::Namespace BindQuestClasses()
+{
+    mluabind::Namespace ns("qe");
+    ns.AddClass(Class<CTreeNode>("CTreeNode"));
+    ns.AddClass(BaseSceneObjectClass());
+    ns.Merge(SceneObjectClasses()).Merge(TreeClasses()).Merge(PointersAndWalks());
+    ns.AddFunction(mluabind::Function("GetClipTime", &GetClipTime));
+    ns.AddFunction(mluabind::Function("Clip_GetObjectById", &Clip_GetObjectById));
+    ns.AddFunction(mluabind::Function("TryAlpha", &TryAlpha));
+    return ns;
+}
+
+} // namespace qe

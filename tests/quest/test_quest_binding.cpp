@@ -1,0 +1,115 @@
+// The quest tree from Lua: building a scene with the bound classes, walking its lists, and
+// the reference counts of objects a script holds while the tree lets them go.
+#include "lua/LuaTestHost.h"
+#include "lua/mluabind/StdBinding.h"
+#include "quest/Area.h"
+#include "quest/ImageObject.h"
+#include "quest/Level.h"
+#include "quest/QuestBinding.h"
+#include "quest/SceneGroup.h"
+#include "support/TestSupport.h"
+
+using namespace qe;
+
+namespace {
+
+// An image that counts the living ones.
+struct CountedImage : CImageObject {
+    static inline int Alive = 0;
+    CountedImage() { ++Alive; }
+    ~CountedImage() override { --Alive; }
+};
+
+LevelPtrT g_Level;
+
+struct QuestBinding : ::testing::Test {
+    oxtest::LuaTestHost host;
+
+    void SetUp() override
+    {
+        host.Declare([] { return mluabind::BindStdStrings(); });
+        host.Declare([] { return BindQuestClasses(); });
+        host.Declare([] {
+            mluabind::Namespace test("test");
+            test.AddFunction(mluabind::Function("Level", [] { return g_Level.get(); }));
+            test.AddFunction(mluabind::Function("Alive", [] { return CountedImage::Alive; }));
+            return test;
+        });
+        g_Level.reset(new CLevel());
+        ScenePtrT scene(new CScene());
+        scene->SetId("main");
+        g_Level->InsertScene(scene, nullptr);
+        for (const char* id : {"key", "lamp"}) {
+            BaseSceneObjectPtrT image(new CountedImage());
+            image->SetId(id);
+            scene->InsertObject(image, scene->Objects().empty() ? nullptr : scene->Objects().back().get());
+        }
+        scene->UpdateTotalChildList();
+    }
+    void TearDown() override { g_Level.reset(); }
+    void Collect() { lua_gc(host.GetLuaState(), LUA_GCCOLLECT, 0); }
+};
+
+} // namespace
+
+TEST_F(QuestBinding, ScriptsBuildAndWalkTheTree)
+{
+    EXPECT_EQ(host.Run(R"(
+        local scene = test.Level().GetSceneById('main')
+        local group = qe.CSceneGroup()
+        group.SetId('drawer')
+        for _, id in ipairs({'closed', 'open'}) do
+            local state = qe.CImageObject()
+            state.SetId(id)
+            group.InsertChild(qe.CBaseSceneObjectPtrT(state), nil)
+        end
+        scene.InsertObject(qe.CBaseSceneObjectPtrT(group), nil)
+        scene.UpdateTotalChildList()
+        local ids = {}
+        local it = scene.GetChilds()
+        while not it.IsEnd() do
+            table.insert(ids, it.Get().GetId().c_str())
+            it.Next()
+        end
+        return table.concat(ids, ' '))"),
+              "open closed key lamp");
+    EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
+
+    EXPECT_EQ(host.Run(R"(
+        local level = test.Level()
+        local found = level.FindObjectById('open', true, false)
+        found.RaiseObjectFlag(qe.CBaseSceneObject.ObjectFlagHidden)
+        return tostring(found.GetParentGroup().GetFirstVisibleState().c_str()) .. ' ' ..
+               level.GetSceneById('main').EnumObjects() .. ' ' .. qe.CScene.FlagSceneInNewWindow .. ' ' ..
+               qe.CLevel.ScriptStart .. ' ' .. found.GetType())"),
+              "closed 3 2 1 1");
+    EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
+}
+
+TEST_F(QuestBinding, AnObjectHeldFromLuaOutlivesItsRemoval)
+{
+    CBaseSceneObject* key = g_Level->FindObjectById("key", false, false);
+    ASSERT_NE(key, nullptr);
+    EXPECT_EQ(key->GetRefCount(), 2) << "the scene's list and its flat list";
+    EXPECT_EQ(host.Run("held = qe.CBaseSceneObjectPtrT(test.Level().FindObjectById('key', false, false)) "
+                       "return held.GetId().c_str()"),
+              "key");
+    Collect();
+    EXPECT_EQ(key->GetRefCount(), 3);
+
+    g_Level->RemoveObject("key");
+    Collect();
+    EXPECT_EQ(key->GetRefCount(), 1) << "only the script holds it now";
+    EXPECT_EQ(CountedImage::Alive, 2);
+    EXPECT_EQ(host.Run("return held.GetId().c_str() .. ' ' .. tostring(test.Level().FindObjectById('key', false, true))"),
+              "key nil");
+
+    // A copy of the pointer counts too; the last one to go takes the object.
+    EXPECT_EQ(host.Run("second = qe.CBaseSceneObjectPtrT(held.get()) held = nil"), "nil");
+    Collect();
+    EXPECT_EQ(key->GetRefCount(), 1);
+    EXPECT_EQ(host.Run("second = nil"), "nil");
+    Collect();
+    EXPECT_EQ(CountedImage::Alive, 1);
+    EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
+}
