@@ -313,3 +313,62 @@ TEST(QuestTree, GroupCyclesAreRefusedWithALogLine)
     inner.reset();
     EXPECT_EQ(leaf->GetParentGroup(), nullptr);
 }
+
+TEST_F(QuestLevel, WalksAfterMovingObjectsBetweenScenes)
+{
+    // Plain objects are hit inside their rectangles.
+    auto place = [](CBaseSceneObject& o, FloatVector pos) {
+        o.SetPos(pos);
+        o.SetSize({20, 20});
+    };
+    BaseSceneObjectPtrT vase(new CObject());
+    vase->SetId("vase");
+    place(*vase, {200, 200});
+    Append(*a, vase);
+    a->UpdateTotalChildList();
+    level->UpdateFocusedObject(vase.get());
+    EXPECT_EQ(a->GetObjectAt({200, 200}, nullptr), vase.get());
+
+    // To scene b, on top.
+    a->RemoveObject(*vase);
+    b->InsertObject(vase, nullptr);
+    a->UpdateTotalChildList();
+    b->UpdateTotalChildList();
+    EXPECT_EQ(a->GetObjectAt({200, 200}, nullptr), nullptr);
+    EXPECT_EQ(b->GetObjectAt({200, 200}, nullptr), vase.get());
+    EXPECT_EQ(a->IsContentObject("vase"), nullptr);
+    EXPECT_EQ(b->IsContentObject("vase"), vase.get());
+    EXPECT_EQ(level->FindObjectById("vase", false, false), vase.get());
+    EXPECT_EQ(Ids(b->Childs()), "vase b1 x");
+
+    // A state moved from a group of a to a group of b takes the flags of its new group.
+    BaseSceneObjectPtrT cup(new CObject());
+    cup->SetId("cup");
+    place(*cup, {50, 50});
+    g->InsertChild(cup, nullptr);
+    a->UpdateTotalChildList();
+    EXPECT_EQ(a->GetObjectAt({50, 50}, nullptr), cup.get());
+    SceneGroupPtrT shelf(new CSceneGroup());
+    shelf->SetId("shelf");
+    Append(*b, shelf);
+    g->RemoveChild(*cup);
+    EXPECT_EQ(cup->GetParentGroup(), nullptr);
+    shelf->InsertChild(cup, nullptr);
+    shelf->RaiseObjectFlag(CBaseSceneObject::ObjectFlagHidden);
+    a->UpdateTotalChildList();
+    b->UpdateTotalChildList();
+    EXPECT_EQ(Ids(a->Childs()), "b1 s1 s2");
+    EXPECT_EQ(Ids(b->Childs()), "vase b1 x cup");
+    EXPECT_EQ(a->GetObjectAt({50, 50}, nullptr), nullptr);
+    EXPECT_EQ(b->GetObjectAt({50, 50}, nullptr), nullptr) << "its new group is hidden";
+    shelf->ClearObjectFlag(CBaseSceneObject::ObjectFlagHidden);
+    EXPECT_EQ(b->GetObjectAt({50, 50}, nullptr), cup.get());
+    EXPECT_EQ(level->FindObjectById("cup", true, false), cup.get());
+
+    // The focus went along; taking the object out of the level drops it.
+    EXPECT_EQ(level->GetFocusedObject(), vase.get());
+    level->RemoveObject("vase");
+    EXPECT_EQ(level->GetFocusedObject(), nullptr);
+    EXPECT_EQ(Ids(b->Childs()), "b1 x cup");
+    EXPECT_EQ(vase->GetRefCount(), 1) << "only the test holds it";
+}
