@@ -141,6 +141,12 @@ bool CTexturesAlpha::IsOpaque(const char* _from, int x, int y) const
     OX_CHECK_DATA(_from && IsAvailable(), false);
     const TextureAlphaDesc* desc = Find(_from);
     OX_CHECK_DATA(desc, false);
+    return IsOpaque(*desc, x, y);
+}
+
+bool CTexturesAlpha::IsOpaque(const TextureAlphaDesc& mask, int x, int y) const
+{
+    const TextureAlphaDesc* desc = &mask;
     if (desc->uniform)
         return desc->uniform_value != 0;
     if (x < 0 || y < 0 || x >= desc->width || y >= desc->height)

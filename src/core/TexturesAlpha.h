@@ -92,6 +92,8 @@ public:
     bool IsOpaque(const misc::StringA88& id, int x, int y) const { return IsOpaque(id.c_str(), x, y); }
     // The same for the texture's id (its description must exist).
     bool IsOpaque(const graphics::CTexture& texture, int x, int y) const;
+    // The same for a mask Find gave (no search).
+    bool IsOpaque(const TextureAlphaDesc& mask, int x, int y) const;
 
 private:
     void Release();

@@ -152,7 +152,7 @@ void CClipObject::Draw(ox::graphics::CRenderer* renderer)
 
 bool CClipObject::IsContains(const FloatVector& point, const ox::core::CTexturesAlpha* masks) const
 {
-    if (!HasClip() || !CSceneObject::IsContains(point, masks))
+    if (!HasClip() || !IsInContour(point))
         return false;
     if (!m_UseAlpha)
         return true;

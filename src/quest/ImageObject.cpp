@@ -1,8 +1,8 @@
 #include "quest/ImageObject.h"
 
+#include "core/TexturesAlpha.h"
 #include "diag/Log.h"
 #include "graphics/Renderer.h"
-#include "quest/PixelTest.h"
 
 #include <cmath>
 
@@ -43,7 +43,7 @@ void CImageObject::Draw(ox::graphics::CRenderer* renderer)
 
 bool CImageObject::IsContains(const FloatVector& point, const ox::core::CTexturesAlpha* masks) const
 {
-    if (!CSceneObject::IsContains(point, masks))
+    if (!IsInContour(point))
         return false;
     const ox::graphics::CTexture* texture = m_Image.GetTexture();
     if (!texture) {
@@ -54,8 +54,10 @@ bool CImageObject::IsContains(const FloatVector& point, const ox::core::CTexture
         return false;
     }
     const FloatVector pixel = ToPicture(point);
-    return IsSolidPixel(*texture, m_TextureId.c_str(), static_cast<int>(std::floor(pixel.X)),
-                        static_cast<int>(std::floor(pixel.Y)), m_Image.GetCurrentFrame(), masks);
+    const int x = static_cast<int>(std::floor(pixel.X)), y = static_cast<int>(std::floor(pixel.Y));
+    if (const ox::core::TextureAlphaDesc* mask = m_Mask.Find(masks, m_TextureId))
+        return masks->IsOpaque(*mask, x, y);
+    return IsSolidPixel(*texture, nullptr, nullptr, x, y, m_Image.GetCurrentFrame());
 }
 
 BaseSceneObjectPtrT CImageObject::Clone() const

@@ -2,6 +2,7 @@
 // A picture in a scene: a declared texture (animated or not) drawn centred on the object's
 // position at its shown size, turned by its angle. It takes a click only on a solid pixel.
 #include "graphics/Image.h"
+#include "quest/PixelTest.h"
 #include "quest/SceneObject.h"
 
 namespace qe {
@@ -29,6 +30,7 @@ public:
 private:
     ox::graphics::CImage m_Image;
     std::string m_TextureId;
+    CMaskLookup m_Mask;
     // A hit test without a texture was logged (once, not on every move of the mouse).
     mutable bool m_Reported = false;
 };

@@ -24,6 +24,21 @@ FloatVector TurnAbout(const FloatVector& point, const FloatVector& centre, float
     return {centre.X + d.X * c - d.Y * s, centre.Y + d.X * s + d.Y * c};
 }
 
+Poly4 RectanglePoly(const FloatVector& pos, const FloatVector& size, float angle)
+{
+    const float x1 = pos.X - size.X / 2, x2 = pos.X + size.X / 2;
+    const float y1 = pos.Y - size.Y / 2, y2 = pos.Y + size.Y / 2;
+    const float left = std::min(x1, x2), right = std::max(x1, x2);
+    const float top = std::min(y1, y2), bottom = std::max(y1, y2);
+    Poly4 poly {{{left, top}, {right, top}, {right, bottom}, {left, bottom}}};
+    if (angle != 0) {
+        const float c = std::cos(angle), s = std::sin(angle);
+        for (auto& point : poly.Points)
+            point = TurnAbout(point, pos, c, s);
+    }
+    return poly;
+}
+
 } // namespace
 
 // CBaseSceneObject --------------------------------------------------------------------------
@@ -59,21 +74,7 @@ void CBaseSceneObject::SetLuaScript(const std::string& script, int kind)
         m_Scripts[kind] = script;
 }
 
-Poly4 CBaseSceneObject::GetPoly() const
-{
-    const FloatVector pos = GetPos(), size = GetSize();
-    const float x1 = pos.X - size.X / 2, x2 = pos.X + size.X / 2;
-    const float y1 = pos.Y - size.Y / 2, y2 = pos.Y + size.Y / 2;
-    const float left = std::min(x1, x2), right = std::max(x1, x2);
-    const float top = std::min(y1, y2), bottom = std::max(y1, y2);
-    Poly4 poly {{{left, top}, {right, top}, {right, bottom}, {left, bottom}}};
-    if (const float angle = GetAngle(); angle != 0) {
-        const float c = std::cos(angle), s = std::sin(angle);
-        for (auto& point : poly.Points)
-            point = TurnAbout(point, pos, c, s);
-    }
-    return poly;
-}
+Poly4 CBaseSceneObject::GetPoly() const { return RectanglePoly(GetPos(), GetSize(), GetAngle()); }
 
 bool CBaseSceneObject::IsParentGroupVisible() const
 {
@@ -152,12 +153,18 @@ void CBaseSceneObject::DoDrawForEditor(CRenderer* renderer)
 
 bool CSceneObject::IsContains(const FloatVector& point, const ox::core::CTexturesAlpha*) const
 {
+    return IsInRectangle(point, GetPos(), GetSize(), GetAngle());
+}
+
+bool CSceneObject::IsInRectangle(const FloatVector& point, const FloatVector& pos, const FloatVector& size,
+                                 float angle)
+{
     // The circle through the corners holds the whole rectangle, whatever its turn: a point
     // outside it is outside without the corners being worked out.
-    const FloatVector d = point - GetPos(), size = GetSize();
+    const FloatVector d = point - pos;
     if (d.X * d.X + d.Y * d.Y > (size.X * size.X + size.Y * size.Y) / 4)
         return false;
-    return ox::misc::IsInside(GetPoly(), point);
+    return ox::misc::IsInside(RectanglePoly(pos, size, angle), point);
 }
 
 void CSceneObject::CopyTo(CSceneObject& clone) const

@@ -150,6 +150,8 @@ public:
 
 protected:
     void CopyTo(CSceneObject& clone) const;
+    // The contour test of a rectangle of `size` centred on `pos`, turned by `angle`.
+    static bool IsInRectangle(const FloatVector& point, const FloatVector& pos, const FloatVector& size, float angle);
 
 private:
     std::string m_Sound;
@@ -172,6 +174,8 @@ public:
 
 protected:
     void CopyTo(CObject& clone) const;
+    // IsContains of a scene object, on the fields.
+    bool IsInContour(const FloatVector& point) const { return IsInRectangle(point, m_Pos, m_Size, m_Angle); }
     // A scene point in picture pixels: unturned about the position, scaled from the shown
     // size to the native one, measured from the picture's top left corner.
     FloatVector ToPicture(const FloatVector& point) const;

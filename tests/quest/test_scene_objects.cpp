@@ -215,7 +215,19 @@ TEST_F(SceneObjects, TheAlphaMaskStoreAnswersBeforeAnyPixelIsRead)
     AddImage("masked", {100, 100}, {80, 80});
     EXPECT_EQ(HitAt(100, 100, &masks), "masked") << "the mask says solid where the pixels have a hole";
     EXPECT_EQ(surface.GetBuffer(), nullptr) << "and no pixel copy was made";
-    EXPECT_EQ(HitAt(100, 100), "none");
+
+    // The store loaded again answers anew: a clear mask, then no mask for the texture.
+    ox::core::AlphaMaskSource other = solid;
+    other.pixels.assign(64, 0);
+    std::vector<uint8_t> clear, without;
+    ASSERT_TRUE(ox::core::BuildTexturesAlpha({other}, clear));
+    ASSERT_TRUE(masks.LoadFromMemory(clear.data(), clear.size()));
+    EXPECT_EQ(HitAt(65, 65, &masks), "none");
+    other.id = "another";
+    ASSERT_TRUE(ox::core::BuildTexturesAlpha({other}, without));
+    ASSERT_TRUE(masks.LoadFromMemory(without.data(), without.size()));
+    EXPECT_EQ(HitAt(65, 65, &masks), "masked") << "the pixels answer";
+    EXPECT_EQ(HitAt(100, 100, &masks), "none");
 }
 
 TEST_F(SceneObjects, GroupFlagsAndStatesReachEveryState)
