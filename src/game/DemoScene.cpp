@@ -4,7 +4,11 @@
 #include "core/SettingsReaders.h"
 #include "graphics/Font.h"
 #include "gui/WidgetFactory.h"
+#include "core/TextureManager.h"
 #include "misc/StringTable.h"
+#include "quest/Area.h"
+#include "quest/ClipObject.h"
+#include "quest/ImageObject.h"
 
 #include <cmath>
 
@@ -102,6 +106,7 @@ void CDemoScene::StartClip()
 {
     if (m_Clip.Load("demo_show"))
         m_Clip.SetPos({790, 400});
+    m_Quest.Build();
 }
 
 void CDemoScene::LoadPanel(const core::CSettingsGroup& gui, const core::CSettingsGroup& templates)
@@ -117,6 +122,7 @@ void CDemoScene::LoadPanel(const core::CSettingsGroup& gui, const core::CSetting
 void CDemoScene::Update(unsigned timeMs)
 {
     m_Clip.Update();
+    m_Quest.Update(timeMs);
     if (!m_Panel)
         return;
     const float breath = 0.5f + 0.5f * std::sin(timeMs / 1000.0f);
@@ -187,6 +193,7 @@ void CDemoScene::Draw(graphics::CRenderer& r, unsigned timeMs)
     m_Stone.Draw(r);
     m_Frame.Draw(r);
     m_Clip.Draw(&r);
+    m_Quest.Draw(r);
     DrawText(r, t);
     if (m_Panel)
         m_Panel->Draw(r);
@@ -223,6 +230,101 @@ void CDemoScene::DrawText(graphics::CRenderer& r, float t)
     r.RenderText(*small, line, misc::IntRect(300, 470, 400, 30), Renderer::TextCenterH, 0, Color(0xFFFFFFFFu),
                  Color(0u), Color(0xFF101010u), Color(0xFFF0C040u), first, first + 8);
     r.RenderText(*small, u"underlined", misc::IntRect(60, 440, 200, 30), Renderer::TextUnderline);
+}
+
+// The quest scene -----------------------------------------------------------------------
+
+namespace {
+
+// Where the quest scene stands on the canvas, and its size.
+constexpr FloatRect kQuestFrame {270, 90, 250, 160};
+
+template <class T>
+boost::intrusive_ptr<T> Placed(T* object, const char* id, FloatVector pos, FloatVector size, float angle = 0)
+{
+    object->SetId(id);
+    object->SetPos(pos);
+    object->SetSize(size);
+    object->SetAngle(angle);
+    return boost::intrusive_ptr<T>(object);
+}
+
+qe::ImageObjectPtrT Image(const char* id, const char* texture, FloatVector pos, FloatVector size, float angle = 0)
+{
+    qe::ImageObjectPtrT image = Placed(new qe::CImageObject(), id, pos, size, angle);
+    image->SetTextureId(texture);
+    return image;
+}
+
+} // namespace
+
+void CDemoQuestScene::Build()
+{
+    m_Level.reset(new qe::CLevel());
+    m_Scene.reset(new qe::CScene());
+    m_Scene->SetSize({kQuestFrame.Width, kQuestFrame.Height});
+    m_Level->InsertScene(m_Scene, nullptr);
+
+    // Front first: what is inserted behind the last object lies below it.
+    auto append = [this](qe::BaseSceneObjectPtrT object) {
+        m_Scene->InsertObject(object, m_Scene->Objects().empty() ? nullptr : m_Scene->Objects().back().get());
+    };
+    append(Image("disc", "demo_disc", {70, 80}, {96, 96}));
+    append(Image("stone", "demo_stone", {120, 90}, {70, 70}));
+    append(Image("spinner", "demo_spinner", {205, 45}, {56, 56}, 0.3f));
+    m_Lamp.reset(new qe::CSceneGroup());
+    m_Lamp->SetId("lamp");
+    qe::ImageObjectPtrT on = Image("lamp_on", "demo_disc", {205, 120}, {44, 44});
+    qe::ImageObjectPtrT off = Image("lamp_off", "demo_disc", {205, 120}, {36, 36});
+    on->SetColor(Color(0xFFFFE060u));
+    off->SetColor(Color(0xFF606060u));
+    off->RaiseObjectFlag(qe::CBaseSceneObject::ObjectFlagHidden);
+    m_Lamp->InsertChild(on, nullptr);
+    m_Lamp->InsertChild(off, on.get());
+    append(m_Lamp);
+    qe::ClipObjectPtrT orbit = Placed(new qe::CClipObject(), "orbit", {150, 40}, {64, 64});
+    orbit->SetClipId("demo_orbit");
+    orbit->UseAlpha(true);
+    append(orbit);
+    qe::AreaPtrT door(new qe::CArea());
+    door->SetId("door");
+    for (FloatVector p : {FloatVector(8, 152), FloatVector(30, 112), FloatVector(52, 152)})
+        door->InsertPoint(qe::AreaPointPtrT(new qe::CAreaPoint(p)), door->Points().empty() ? nullptr : door->Points().back().get());
+    m_Scene->InsertArea(door, nullptr);
+    m_Scene->UpdateTotalChildList();
+}
+
+void CDemoQuestScene::Update(unsigned timeMs)
+{
+    if (!m_Scene)
+        return;
+    m_Lamp->SetCurrent((timeMs / 1500) % 2 ? "lamp_off" : "lamp_on", false, 0, nullptr);
+    m_Scene->UpdateGame();
+    const float a = timeMs / 1000.0f;
+    m_Probe = {125 + 105 * std::cos(a * 0.7f), 80 + 65 * std::sin(a * 1.1f)};
+    m_Hit = m_Scene->GetObjectAt(m_Probe, &core::CTextureManager::Instance().GetTexturesAlpha());
+}
+
+void CDemoQuestScene::Draw(graphics::CRenderer& r)
+{
+    if (!m_Scene)
+        return;
+    r.PushState();
+    r.ApplyMatrix(misc::MatrixTranslation(kQuestFrame.X, kQuestFrame.Y));
+    const FloatRect inside(0, 0, kQuestFrame.Width, kQuestFrame.Height);
+    r.SetClipPoly(misc::RectToPoly4(inside));
+    r.RenderFilledPoly4(misc::RectToPoly4(inside), Color(0xFF101418u));
+    m_Scene->DrawGame(&r);
+    const Color mark(m_Hit ? 0xFF40FF40u : 0xFFFF4040u);
+    if (m_Hit && m_Hit->GetType() == qe::CBaseSceneObject::ObjectType && m_Hit->GetSize().X != 0) {
+        const misc::Poly4 outline = m_Hit->GetPoly();
+        for (int i = 0; i < 4; ++i)
+            r.RenderLine(outline[i], outline[(i + 1) % 4], mark);
+    }
+    r.RenderLine(m_Probe - FloatVector(6, 0), m_Probe + FloatVector(6, 0), mark);
+    r.RenderLine(m_Probe - FloatVector(0, 6), m_Probe + FloatVector(0, 6), mark);
+    r.RenderRect(inside, Color(0xFFF0C040u));
+    r.PopState();
 }
 
 } // namespace k17

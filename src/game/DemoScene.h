@@ -6,11 +6,32 @@
 #include "graphics/Texture.h"
 #include "misc/animation/Clip.h"
 #include "gui/Widget.h"
+#include "quest/Level.h"
+#include "quest/SceneGroup.h"
 
 #include <memory>
 #include <vector>
 
 namespace k17 {
+
+// A small quest scene built in code, in a frame of its own: a disc with holes over a stone,
+// a turned sprite sheet, a lamp group whose two states take turns, the orbit clip tested by
+// its pixels, and an area. A probe circling over it outlines the object a click there would
+// reach (green), or shows red where the click would fall through to nothing.
+class CDemoQuestScene {
+public:
+    // Once textures and clips are declared.
+    void Build();
+    void Update(unsigned timeMs);
+    void Draw(ox::graphics::CRenderer& renderer);
+
+private:
+    qe::LevelPtrT m_Level;
+    qe::ScenePtrT m_Scene;
+    qe::SceneGroupPtrT m_Lamp;
+    ox::misc::FloatVector m_Probe;
+    const qe::CBaseSceneObject* m_Hit = nullptr;
+};
 
 class CDemoScene : public ox::graphics::IDeviceResourceOwner {
 public:
@@ -47,6 +68,7 @@ private:
     ox::misc::anim::CClip m_Clip;
     ox::gui::WidgetPtrT m_Panel;
     float m_PanelWidth = 0;
+    CDemoQuestScene m_Quest;
 };
 
 } // namespace k17
