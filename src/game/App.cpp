@@ -14,7 +14,9 @@
 #include "misc/animation/ClipServices.h"
 #include "misc/animation/ClipsLoader.h"
 #include "misc/sys/Path.h"
+#include "quest/LuaThreadManager.h"
 #include "quest/QuestBinding.h"
+#include "quest/QuestData.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -108,7 +110,7 @@ void CApp::BindScripts()
 {
     m_Lua->BeginBinding();
     m_Lua->Bind(mluabind::BindStdStrings());
-    m_Lua->Bind(mluabind::Namespace("ox").Merge(lua::BindFileWatcher()).Merge(lua::BindLuaClasses()));
+    m_Lua->Bind(mluabind::Namespace("ox").Merge(lua::BindFileWatcher()).Merge(lua::BindLuaClasses()).Merge(lua::BindGroupTimers()));
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
@@ -169,6 +171,9 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     });
     fonts.LoadGroup(m_ResourceDeclarations, nullptr);
+    // The quest: the pack's compiled form, or quest.xml compiled now. Levels are built from it
+    // on demand, binding their textures and clips.
+    qe::g_QuestData::Instance().Load();
     // Clips draw the declared textures and fonts.
     misc::anim::ClipServices& clips = misc::anim::GetClipServices();
     clips.textures = [](const char* id) -> const graphics::CTexture* {
@@ -243,21 +248,9 @@ void CApp::DrawFps(graphics::CRenderer* renderer)
 
 void CApp::DoUpdate()
 {
-    if (m_Lua) {
+    if (m_Lua)
         m_Lua->CheckFileChanges();
-        // The script threads, once the scripts define their manager. Their absence is
-        // reported once, not every frame.
-        lua_State* L = m_Lua->GetLuaState();
-        lua_pushstring(L, "ManageThreads");
-        lua_rawget(L, LUA_GLOBALSINDEX);
-        bool present = lua_isfunction(L, -1);
-        lua_pop(L, 1);
-        if (present)
-            lua::CallLuaFunction(m_Lua.get(), "ManageThreads");
-        else if (!m_ManageThreadsReported)
-            OX_LOG("lua", diag::LogWarning, "the script function ManageThreads is missing: script threads do not run");
-        m_ManageThreadsReported = !present;
-    }
+    qe::g_LuaThreadManager::Instance().ManageThreads();
     if (m_Demo)
         m_Demo->Update(m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
     CApplication::DoUpdate();

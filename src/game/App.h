@@ -54,8 +54,6 @@ private:
     std::unique_ptr<CDemoScene> m_Demo;
     // Serves the fonts' glyph images until the texture manager does.
     bool m_OutputRedirected = false;
-    // A missing ManageThreads was reported; it is reported again only after it existed.
-    bool m_ManageThreadsReported = false;
 };
 
 } // namespace k17

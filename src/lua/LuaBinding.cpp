@@ -2,6 +2,7 @@
 
 #include "lua/Lua.h"
 #include "lua/mluabind/StdBinding.h"
+#include "core/TimeManager.h"
 #include "misc/FileWatcher.h"
 
 namespace ox::lua {
@@ -35,6 +36,27 @@ mluabind::Namespace BindFileWatcher()
                     .Method("GetChangedFiles", &CFileWatcher::GetChangedFiles)
                     .Method("ResetChanges", &CFileWatcher::ResetChanges));
     ns.Merge(mluabind::VectorClass<wstring>("CFileWatcher.FileNamesT"));
+    return ns;
+}
+
+namespace {
+
+core::CGroupTimer* GetRootGroupTimer() { return core::GetTimeManager().GetRoot(); }
+
+} // namespace
+
+mluabind::Namespace BindGroupTimers()
+{
+    using core::CGroupTimer;
+    using mluabind::Class;
+    mluabind::Namespace ns("core");
+    ns.AddClass(Class<CGroupTimer>("CGroupTimer")
+                    .Method("GetTime", &CGroupTimer::GetTime)
+                    .Method("Pause", &CGroupTimer::Pause)
+                    .Method("IsPaused", &CGroupTimer::IsPaused)
+                    .Method("AttachGroupTimer", &CGroupTimer::AttachGroupTimer)
+                    .Method("GetChildGroupTimer", &CGroupTimer::GetChildGroupTimer));
+    ns.AddFunction(mluabind::Function("GetRootGroupTimer", &GetRootGroupTimer));
     return ns;
 }
 

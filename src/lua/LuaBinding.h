@@ -10,5 +10,8 @@ namespace ox::lua {
 mluabind::Namespace BindLuaClasses();
 // "misc": CFileWatcher and its list of names, CFileWatcher.FileNamesT.
 mluabind::Namespace BindFileWatcher();
+// "core": CGroupTimer (GetTime, Pause, IsPaused, AttachGroupTimer, GetChildGroupTimer) and
+// GetRootGroupTimer, the root of the time tree: what scripts need to give their threads a clock.
+mluabind::Namespace BindGroupTimers();
 
 } // namespace ox::lua

@@ -34,6 +34,8 @@ public:
     // Inside the contour by the crossings of a horizontal ray on either side of the point.
     bool IsContains(const FloatVector& point, const ox::core::CTexturesAlpha* masks) const override;
     BaseSceneObjectPtrT Clone() const override;
+    // Unless brief, the points become those of the `point` children.
+    void Load(const ox::core::CSettingsGroup& element, bool brief) override;
 
     // Behind `after`, or first when it is null or not a point of the contour.
     void InsertPoint(AreaPointPtrT point, const CAreaPoint* after);
@@ -57,6 +59,8 @@ public:
 
 protected:
     bool HasEditorFrame() const override { return false; }
+    const char* XmlName() const override { return "area"; }
+    void SaveChildren(ox::misc::CXmlElement& element, bool brief) const override;
 
 private:
     PointsListT m_Points;

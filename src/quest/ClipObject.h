@@ -18,6 +18,7 @@ public:
     void Draw(ox::graphics::CRenderer* renderer) override;
     bool IsContains(const FloatVector& point, const ox::core::CTexturesAlpha* masks) const override;
     BaseSceneObjectPtrT Clone() const override;
+    void Load(const ox::core::CSettingsGroup& element, bool brief) override;
 
     // Loads the declared clip afresh, runs it silently to where every object stands at its
     // end, and takes its view size as the native size. An unknown id is logged naming the
@@ -33,6 +34,9 @@ public:
     bool IsUsingAlpha() const { return m_UseAlpha; }
     void DisableSounds(bool disable) { m_SoundsDisabled = disable; }
     ox::misc::anim::CClip& GetClip() { return m_Clip; }
+
+protected:
+    void SaveAttributes(ox::misc::CXmlElement& element, bool brief) const override;
 
 private:
     bool HasClip() const { return m_NativeSize.X != 0 && m_NativeSize.Y != 0; }

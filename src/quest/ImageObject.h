@@ -13,6 +13,7 @@ public:
     // Inside the contour and on a solid pixel of the current frame.
     bool IsContains(const FloatVector& point, const ox::core::CTexturesAlpha* masks) const override;
     BaseSceneObjectPtrT Clone() const override;
+    void Load(const ox::core::CSettingsGroup& element, bool brief) override;
 
     // Binds the declared texture and takes its frame size as the native size. An unknown id
     // is logged naming the object, which then draws nothing and takes no click.
@@ -26,6 +27,9 @@ public:
     unsigned GetTotalTime() const;
     void SetTime(unsigned ms) { m_Image.SetTime(ms); }
     unsigned GetAnimTime() const { return m_Image.GetTime(); }
+
+protected:
+    void SaveAttributes(ox::misc::CXmlElement& element, bool brief) const override;
 
 private:
     ox::graphics::CImage m_Image;

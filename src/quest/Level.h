@@ -68,6 +68,10 @@ public:
     void RunLevelScript();
     void RunStartLevelScript();
 
+    // The XML form: id (and unless brief the scripts and sounds), then the scenes.
+    void Save(ox::misc::CXmlElement& parent, bool brief) const;
+    void Load(const ox::core::CSettingsGroup& element, bool brief);
+
     // A deep copy of every scene, linked to the copy; the focus is not copied.
     LevelPtrT Clone() const;
 

@@ -23,6 +23,12 @@ public:
     const LevelsListT& Levels() const { return m_Levels; }
     CLevel* GetLevelById(const std::string& id) const;
 
+    // The editor's form: a Quest element with every level in full. Load adds the file's
+    // levels behind those held; false when the file does not read (logged).
+    bool Load(const std::string& path);
+    // Written whole to a temporary file and renamed over `path`.
+    void Save(const std::string& path) const;
+
 private:
     LevelsListT m_Levels;
 };

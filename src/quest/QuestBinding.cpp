@@ -1,11 +1,15 @@
 #include "quest/QuestBinding.h"
 
 #include "graphics/Renderer.h"
+#include "core/TimeManager.h"
+#include "lua/Lua.h"
 #include "lua/mluabind/StdBinding.h"
 #include "misc/animation/ClipObjects.h"
 #include "quest/Area.h"
 #include "quest/ClipObject.h"
 #include "quest/ImageObject.h"
+#include "quest/LuaThreadManager.h"
+#include "quest/QuestData.h"
 #include "quest/PixelTest.h"
 #include "quest/Quest.h"
 #include "quest/SceneGroup.h"
@@ -231,6 +235,22 @@ mluabind::Namespace PointersAndWalks()
     return ns;
 }
 
+mluabind::Namespace Singletons()
+{
+    mluabind::Namespace ns;
+    using M = CLuaThreadManager;
+    ns.AddClass(Class<M>("CLuaThreadManager")
+                    .Method("SetLua", &M::SetLua)
+                    .Method("SetTimer", &M::SetTimer)
+                    .Method("GetElapsedTime", &M::GetElapsedTime)
+                    .Method("Clear", &M::Clear)
+                    .Method("Error", &M::Error));
+    ns.AddFunction(mluabind::Function("g_LuaThreadManager.Instance", &g_LuaThreadManager::Instance));
+    ns.AddClass(Class<CQuestData>("CQuestData").Method("Load", &CQuestData::Load).Method("CreateLevel", &CQuestData::CreateLevel));
+    ns.AddFunction(mluabind::Function("g_QuestData.Instance", &g_QuestData::Instance));
+    return ns;
+}
+
 } // namespace
 
 mluabind::Namespace BindQuestClasses()
@@ -238,7 +258,7 @@ mluabind::Namespace BindQuestClasses()
     mluabind::Namespace ns("qe");
     ns.AddClass(Class<CTreeNode>("CTreeNode"));
     ns.AddClass(BaseSceneObjectClass());
-    ns.Merge(SceneObjectClasses()).Merge(TreeClasses()).Merge(PointersAndWalks());
+    ns.Merge(SceneObjectClasses()).Merge(TreeClasses()).Merge(PointersAndWalks()).Merge(Singletons());
     ns.AddFunction(mluabind::Function("GetClipTime", &GetClipTime));
     ns.AddFunction(mluabind::Function("Clip_GetObjectById", &Clip_GetObjectById));
     ns.AddFunction(mluabind::Function("TryAlpha", &TryAlpha));

@@ -82,6 +82,12 @@ public:
     // answers the pixel tests of images and alpha clips (it may be null). Null: nothing.
     CBaseSceneObject* GetObjectAt(const FloatVector& point, const ox::core::CTexturesAlpha* masks) const;
 
+    // The XML form: id, size, offset, flags, script, then `objects` and `areas` (brief
+    // objects and areas hold only their game state). A brief load reads only id and flags of
+    // the scene; objects and areas are made anew from their elements.
+    void Save(ox::misc::CXmlElement& parent, bool brief) const;
+    void Load(const ox::core::CSettingsGroup& element, bool brief);
+
     // A deep copy: fields, parent link, cloned areas and objects, the flat list rebuilt.
     ScenePtrT Clone() const;
 
@@ -96,5 +102,9 @@ private:
     std::string m_Script;
     CLevel* m_ParentLevel = nullptr;
 };
+
+// A new object (reference count 0) from an element of a scene's `objects`: `object` of type
+// image or clip, or `group`; null for anything else or a value that does not read (logged).
+CBaseSceneObject* LoadSceneChild_(const ox::core::CSettingsGroup* element, bool brief);
 
 } // namespace qe

@@ -32,6 +32,8 @@ public:
     void DrawTransformed(ox::graphics::CRenderer* renderer) override;
     int GetType() const override { return GroupType; }
     BaseSceneObjectPtrT Clone() const override;
+    // The attributes, then a new state for each child element (the states held are kept).
+    void Load(const ox::core::CSettingsGroup& element, bool brief) override;
 
     // Inserts behind `after` (at the front when it is null or no state) and links the child
     // to the group. A child that is this group or holds it makes a cycle: refused, logged.
@@ -56,6 +58,10 @@ public:
     void SetCurrent(const std::string& id, bool holdFirst, float time, const ox::core::CGroupTimer* timer);
     // Shows the n-th state (from 1) and hides the others; 0 hides them all.
     void SetCurrentByNumber(int number);
+
+protected:
+    const char* XmlName() const override { return "group"; }
+    void SaveChildren(ox::misc::CXmlElement& element, bool brief) const override;
 
 private:
     ChildsListT m_Childs;

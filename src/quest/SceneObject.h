@@ -15,7 +15,11 @@
 #include <string>
 
 namespace ox::core {
+class CSettingsGroup;
 class CTexturesAlpha;
+}
+namespace ox::misc {
+class CXmlElement;
 }
 namespace ox::graphics {
 class CRenderer;
@@ -88,6 +92,13 @@ public:
     // A deep copy without a parent group; null for a kind that has none.
     virtual BaseSceneObjectPtrT Clone() const { return nullptr; }
 
+    // The XML form: an element of the kind's name under `parent`, its attributes (brief: the
+    // game state only), then its children.
+    void Save(ox::misc::CXmlElement& parent, bool brief) const;
+    // Reads the attributes that exist; brief reads the game state only. A value that does not
+    // read raises boost::bad_lexical_cast.
+    virtual void Load(const ox::core::CSettingsGroup& element, bool brief);
+
     // Editor flags. Raise and Clear leave a bit that already has the wanted state alone.
     void RaiseFlag(uint32_t flag) { m_Flags |= flag; }
     void ClearFlag(uint32_t flag) { m_Flags &= ~flag; }
@@ -124,6 +135,10 @@ public:
 
 protected:
     CBaseSceneObject() = default;
+    virtual const char* XmlName() const { return "object"; }
+    // Attributes in the order of the kinds: object_flags, id, hint, editor flags and scripts.
+    virtual void SaveAttributes(ox::misc::CXmlElement& element, bool brief) const;
+    virtual void SaveChildren(ox::misc::CXmlElement&, bool) const {}
     // What every kind copies into its clone: flags, id, hint, scripts and fade alpha.
     void CopyTo(CBaseSceneObject& clone) const;
     // Whether a selected object gets its frame in the editor's view.
@@ -148,7 +163,10 @@ public:
     // Inside the contour of GetPoly; a point on an edge is outside.
     bool IsContains(const FloatVector& point, const ox::core::CTexturesAlpha* masks) const override;
 
+    void Load(const ox::core::CSettingsGroup& element, bool brief) override;
+
 protected:
+    void SaveAttributes(ox::misc::CXmlElement& element, bool brief) const override;
     void CopyTo(CSceneObject& clone) const;
     // The contour test of a rectangle of `size` centred on `pos`, turned by `angle`.
     static bool IsInRectangle(const FloatVector& point, const FloatVector& pos, const FloatVector& size, float angle);
@@ -172,7 +190,14 @@ public:
     // The pixel size of the texture or clip; zero when it is missing.
     FloatVector GetNativeSize() const { return m_NativeSize; }
 
+    void Load(const ox::core::CSettingsGroup& element, bool brief) override;
+
 protected:
+    void SaveAttributes(ox::misc::CXmlElement& element, bool brief) const override;
+    // The colour in a brief save only when it is not opaque white.
+    void SaveColor(ox::misc::CXmlElement& element, bool brief) const;
+    // The `color` attribute, or opaque white without one.
+    void LoadColor(const ox::core::CSettingsGroup& element);
     void CopyTo(CObject& clone) const;
     // IsContains of a scene object, on the fields.
     bool IsInContour(const FloatVector& point) const { return IsInRectangle(point, m_Pos, m_Size, m_Angle); }

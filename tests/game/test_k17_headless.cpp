@@ -111,6 +111,9 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     // scripts/main.lua ran and its Init was called once the window was up.
     EXPECT_TRUE(run.WaitForOutput("Lantern Demo Init: Lua 5.1 in host 'main', lfs present", std::chrono::seconds(5)))
         << run.Output();
+    // A script thread waits on the level clock.
+    EXPECT_TRUE(run.WaitForOutput("Lantern Demo: the lamp flickered 3 times on the level clock", std::chrono::seconds(5)))
+        << run.Output();
 
     // Editing the main script while the game runs runs it again in the same state: what
     // Init stored is still there.
@@ -145,11 +148,10 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
     EXPECT_EQ(log.find("[font]"), std::string::npos) << "the demo's fonts load:\n" << log;
     EXPECT_EQ(log.find("assertion failed"), std::string::npos) << log;
-    // The demo defines no ManageThreads: said once, not every frame.
-    const std::string missing = "ManageThreads is missing";
-    size_t first = log.find(missing);
-    EXPECT_NE(first, std::string::npos) << log;
-    EXPECT_EQ(log.find(missing, first + 1), std::string::npos) << log;
+    // The script threads run once per frame: the first builds the level from the quest data.
+    EXPECT_TRUE(run.Output().find("Lantern Demo: level1 built from the quest data: 2 scenes, 7 objects") !=
+                std::string::npos) << run.Output() << log;
+    EXPECT_NE(log.find("[quest][1]: Quest data: properties/quest.xml compiled"), std::string::npos) << log;
     // The declared textures are known, and none of them failed to load.
     EXPECT_NE(log.find("[texman][0]: Texture information created in"), std::string::npos) << log;
     EXPECT_EQ(log.find("[texman][3]"), std::string::npos) << log;

@@ -18,6 +18,48 @@ function Init()
     lantern.host = text(ox.lua.CLua.GetLua("main").GetId())
     print("Lantern Demo Init: " .. _VERSION .. " in host '" .. lantern.host .. "', lfs " ..
           (lfs and "present" or "missing"))
+    StartThreads()
+end
+
+-- Script threads run in this host on the clock of the group "level" under "main": pausing
+-- that group pauses every wait. The scheduler is scripts/game_engine/quest.lua.
+function StartThreads()
+    local main = ox.lua.CLua.GetLua("main")
+    main.LoadScript("scripts/game_engine/quest.lua")
+    local clock = ox.core.GetRootGroupTimer().GetChildGroupTimer("main")
+    lantern.clock = clock.GetChildGroupTimer("level") or clock.AttachGroupTimer("level")
+    local threads = qe.g_LuaThreadManager.Instance()
+    threads.SetLua(main)
+    threads.SetTimer(lantern.clock)
+    CreateScript("lantern_start", nil)
+end
+
+-- The first thread: once loading is over (the next frame), the level is built from the
+-- quest data and its lamp flickers on the level clock.
+function lantern_start(self)
+    wait(0)
+    local level = qe.g_QuestData.Instance().CreateLevel("level1")
+    if not level then
+        print("Lantern Demo: the quest data has no level1")
+        return
+    end
+    lantern.level = qe.CLevelPtrT(level)
+    local objects = 0
+    local scenes = lantern.level.GetScenes()
+    while not scenes.IsEnd() do
+        objects = objects + scenes.Get().EnumObjects() + scenes.Get().EnumAreas()
+        scenes.Next()
+    end
+    print("Lantern Demo: level1 built from the quest data: " .. lantern.level.EnumScenes() .. " scenes, " ..
+          objects .. " objects")
+    local lamp = __cast(lantern.level.FindObjectById("lamp", false, false), "qe.CSceneGroup")
+    for i = 1, 3 do
+        lamp.SetCurrentByNumber(2)
+        wait(100)
+        lamp.SetCurrentByNumber(1)
+        wait(100)
+    end
+    print("Lantern Demo: the lamp flickered 3 times on the level clock")
 end
 
 function Run()

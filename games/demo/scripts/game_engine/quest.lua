@@ -1,0 +1,103 @@
+-- Lantern Demo: the scheduler of script threads. Every object script runs as a coroutine;
+-- the engine starts one through CreateScript and calls ManageThreads once per frame, which
+-- resumes every thread whose wait is over. Time is the clock the thread manager was given
+-- (qe.g_LuaThreadManager.Instance().SetTimer), so pausing that group pauses every wait.
+-- Whoever loads this file hands the threads' host to the manager (SetLua).
+
+quest = quest or {}
+-- Kept across reloads of the file: the threads already running go on.
+threads = threads or { list = {}, script_object = nil }
+
+local function manager()
+    return qe.g_LuaThreadManager.Instance()
+end
+
+local function now()
+    return manager().GetElapsedTime()
+end
+
+local function text(value)
+    if type(value) == "userdata" then
+        return value.c_str()
+    end
+    return tostring(value)
+end
+
+-- Inside a thread: wait `ms` milliseconds of the threads' clock (0: until the next frame).
+function wait(ms)
+    coroutine.yield(now() + (ms or 0))
+end
+
+-- Resumes a thread once; a thread that raised is reported, naming its script, and dropped.
+local function step(thread, ...)
+    local ok, wake = coroutine.resume(thread.co, ...)
+    if not ok then
+        thread.dead = true
+        manager().Error("script thread " .. thread.name .. ": " .. tostring(wake))
+    elseif coroutine.status(thread.co) == "dead" then
+        thread.dead = true
+    else
+        thread.wake = tonumber(wake) or now()
+    end
+end
+
+-- The object the next script belongs to: that script is a click thread.
+function quest.SetScriptObject(object)
+    threads.script_object = object
+end
+
+-- A coroutine of the global function `name`, started at once with `object` as self.
+function CreateScript(name, object)
+    name = text(name)
+    local fn = _G[name]
+    local click = threads.script_object ~= nil
+    threads.script_object = nil
+    if type(fn) ~= "function" then
+        manager().Error("CreateScript: no script function " .. name)
+        return
+    end
+    local thread = { co = coroutine.create(fn), name = name, click = click, wake = 0 }
+    table.insert(threads.list, thread)
+    step(thread, object)
+end
+
+-- A thread started by a click is still alive.
+function IsClikThread()
+    for _, thread in ipairs(threads.list) do
+        if thread.click and not thread.dead then
+            return true
+        end
+    end
+    return false
+end
+
+-- One pass: every thread whose wake time has come is resumed once; threads started during
+-- the pass wait for the next one; finished threads are dropped.
+function ManageThreads()
+    local time = now()
+    local list = threads.list
+    for i = 1, #list do
+        local thread = list[i]
+        if not thread.dead and thread.wake <= time then
+            step(thread)
+        end
+    end
+    local alive = {}
+    for _, thread in ipairs(threads.list) do
+        if not thread.dead then
+            table.insert(alive, thread)
+        end
+    end
+    threads.list = alive
+end
+
+-- The number of live threads.
+function quest.ThreadCount()
+    return #threads.list
+end
+
+-- What generated click scripts call around their body, and a click that changed nothing.
+function pre_click_event() end
+function post_click_event() end
+function wrone_item_click() end
+function empty_script_function(self) end
