@@ -589,7 +589,9 @@ std::string Describe(const void* data, size_t size)
         return "not a quest dump (wrong magic)\n";
     std::string text;
     char line[256];
+    const uint8_t* reached = bytes + 4;
     EachLevel(bytes, size, [&](const LevelHeader& header, const uint8_t* begin, const uint8_t* end) {
+        reached = end;
         std::string id;
         IdOf(header.id, id);
         snprintf(line, sizeof(line), "level '%s': %u scenes, %u bytes\n", id.c_str(), header.sceneCount, header.size);
@@ -613,6 +615,10 @@ std::string Describe(const void* data, size_t size)
         }
         return false;
     });
+    if (reached != bytes + size) {
+        snprintf(line, sizeof(line), "a damaged level block at byte %zu\n", static_cast<size_t>(reached - bytes));
+        text += line;
+    }
     return text;
 }
 

@@ -6,6 +6,8 @@
 #include "common/LogToStderr.h"
 #include "misc/animation/ClipFormat.h"
 #include "oxdump/Clips.h"
+#include "oxdump/Quest.h"
+#include "quest/QuestData.h"
 #include "diag/Log.h"
 #include "misc/sys/Path.h"
 #include "misc/GamePack.h"
@@ -34,6 +36,7 @@ const char* kUsage =
     "       oxdump texturesalpha <folder|list> <out> [--order auto|rows|columns]\n"
     "                                                    build the alpha-mask table\n"
     "       oxdump clips <clips.xml|folder> <out>        compile the clips\n"
+    "       oxdump quest <quest.xml> <quest.bindump>    compile the quest\n"
     "       oxdump show <file.bindump>                   print the records of a dump\n"
     "       oxdump COMMAND --help                        details of one command\n";
 
@@ -69,7 +72,8 @@ const char* kShowHelp =
     "usage: oxdump show <file.bindump>\n"
     "\n"
     "Checks a binary dump as the game would and prints its records: texture declarations\n"
-    "(resources.bindump), alpha masks (texturesalpha.bindump), clips (clips.bindump) and\n"
+    "(resources.bindump), alpha masks (texturesalpha.bindump), clips (clips.bindump), quests\n"
+    "(quest.bindump) and\n"
     "string tables (strings.bindump, strings.xml.bin_utf16le, strings.xml.bin_utf32le).\n";
 
 int UsageError(const std::string& message, const char* usage = kUsage)
@@ -375,6 +379,8 @@ int Show(int argc, char** argv)
         ox::core::CTexturesAlpha store;
         if ((ok = store.LoadFromMemory(data, size, path.c_str())))
             ShowAlpha(store);
+    } else if (magic == qe::dump::kMagic) {
+        ok = oxdump::ShowQuest(data, size, path.c_str());
     } else if (magic == ox::misc::anim::kClipsMagic) {
         ok = oxdump::ShowClips(data, size, path.c_str());
     } else if (memcmp(data, "S16\x01", 4) == 0 || memcmp(data, "S16L", 4) == 0) {
@@ -422,6 +428,7 @@ int main(int argc, char** argv)
         {"resources", Resources, kResourcesHelp},
         {"texturesalpha", TexturesAlpha, kTexturesAlphaHelp},
         {"clips", oxdump::Clips, oxdump::kClipsHelp},
+        {"quest", oxdump::Quest, oxdump::kQuestHelp},
         {"show", Show, kShowHelp},
     };
     for (const Command& c : commands) {
