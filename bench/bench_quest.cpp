@@ -1,20 +1,32 @@
 // A scene of 2,000 image objects in 50 groups: one frame drawn into a backend that discards
 // vertices, and a hit test whose point lies on no object, through all of them (half of
 // them cover the point with a transparent hole, so their pixel is asked of the alpha-mask
-// store).
+// store). A level of 10 scenes and 2,000 objects built from the quest block; a frame of the
+// demo's scheduler with 1,000 live script threads that each wait one frame.
 #include "NullBackend.h"
 #include "core/TexturesAlpha.h"
 #include "core/TexturesAlphaWriter.h"
 #include "graphics/Image.h"
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
+#include "core/Settings.h"
+#include "core/TimeManager.h"
+#include "lua/Lua.h"
+#include "lua/LuaBinding.h"
+#include "lua/mluabind/StdBinding.h"
 #include "quest/ImageObject.h"
+#include "quest/Level.h"
+#include "quest/LuaThreadManager.h"
+#include "quest/QuestBinding.h"
+#include "quest/QuestData.h"
 #include "quest/Scene.h"
 #include "quest/SceneGroup.h"
 
 #include <benchmark/benchmark.h>
 
 #include <cstdio>
+#include <fstream>
+#include <sstream>
 #include <string>
 
 using namespace qe;
@@ -128,5 +140,100 @@ static void BM_HitTestMiss(benchmark::State& state)
     state.SetItemsProcessed(state.iterations() * kObjects);
 }
 BENCHMARK(BM_HitTestMiss)->Unit(benchmark::kMicrosecond);
+
+namespace {
+
+// 10 scenes of 200 objects: 180 images, then 5 groups of 4 states. Five other levels come
+// first, so that the search steps over them.
+std::string LevelXml()
+{
+    std::string xml = "<?xml version='1.0'?><Quest>";
+    for (int l = 0; l < 5; ++l)
+        xml += "<level id='other" + std::to_string(l) + "'><scene id='s'/></level>";
+    xml += "<level id='big' s1='check()' s2='intro()'>";
+    auto image = [](int n) {
+        return "<object type='image' id='o" + std::to_string(n) + "' object_flags='0' hint='$10" + std::to_string(n % 10) +
+               "' s1='take(self) do return end' offset='" + std::to_string(n % 1000) + " 300' angle='0' size='64 64' "
+               "color='-1' image_id='" + TextureId(n % kTextures) + "'/>";
+    };
+    int n = 0;
+    for (int sc = 0; sc < 10; ++sc) {
+        xml += "<scene id='scene" + std::to_string(sc) + "' size='1024 768' flags='1'><objects>";
+        for (int i = 0; i < 180; ++i)
+            xml += image(n++);
+        for (int g = 0; g < 5; ++g) {
+            xml += "<group id='g" + std::to_string(n++) + "' s1='self.SetCurrentByNumber(2)'>";
+            for (int i = 0; i < 3; ++i)
+                xml += image(n++);
+            xml += "</group>";
+        }
+        xml += "</objects><areas><area id='a" + std::to_string(sc) + "'><point offset='0 0'/><point offset='9 0'/>"
+               "<point offset='9 9'/></area></areas></scene>";
+    }
+    return xml + "</level></Quest>";
+}
+
+} // namespace
+
+static void BM_CreateLevel(benchmark::State& state)
+{
+    ox::graphics::CSurface surface {kTextureSize, kTextureSize};
+    ox::graphics::CTexture texture {&surface};
+    ox::graphics::CImage::SetTextureLookup([&](const char*) { return &texture; });
+    const std::string xml = LevelXml();
+    ox::core::CSettings settings;
+    settings.LoadXmlFromMemory(xml.data(), xml.size(), "bench.xml");
+    CQuestData data;
+    data.SetBlock(dump::Compile(settings.GetChild("Quest"), "bench.xml"));
+    size_t objects = 0;
+    for (auto _ : state) {
+        LevelPtrT level(data.CreateLevel("big"));
+        objects = 0;
+        for (const ScenePtrT& scene : level->Scenes())
+            objects += scene->EnumChilds() + scene->EnumObjects() - 180;
+        benchmark::DoNotOptimize(level.get());
+    }
+    ox::graphics::CImage::SetTextureLookup(nullptr);
+    if (objects != 2000)
+        state.SkipWithError("the level must hold 2,000 objects (1,950 pictures and 50 groups)");
+    state.counters["block KiB"] = static_cast<double>(data.GetSize()) / 1024.0;
+}
+BENCHMARK(BM_CreateLevel)->Unit(benchmark::kMillisecond);
+
+static void BM_ManageThreads(benchmark::State& state)
+{
+    ox::core::CTimeManager time;
+    ox::core::CGroupTimer* clock = time.AttachGroupTimer("bench_level", nullptr);
+    ox::lua::CLua lua("bench_threads", false);
+    lua.BeginBinding();
+    lua.Bind(mluabind::BindStdStrings());
+    lua.Bind(mluabind::Namespace("ox").Merge(ox::lua::BindLuaClasses()).Merge(ox::lua::BindGroupTimers()));
+    lua.Bind(BindQuestClasses());
+    lua.EndBinding();
+    std::ifstream file(std::string(OX_DEMO_GAME) + "/scripts/game_engine/quest.lua");
+    std::stringstream scheduler;
+    scheduler << file.rdbuf();
+    lua.Run(scheduler.str());
+    CLuaThreadManager& manager = g_LuaThreadManager::Instance();
+    manager.SetLua(lua);
+    manager.SetTimer(clock);
+    lua.Run("resumes = 0 function waiter(self) while true do resumes = resumes + 1 wait(0) end end "
+            "for i = 1, 1000 do CreateScript('waiter', nil) end");
+    unsigned now = 0;
+    for (auto _ : state) {
+        clock->SetTime(now += 20);
+        manager.ManageThreads();
+    }
+    lua_State* L = lua.GetLuaState();
+    lua_getglobal(L, "resumes");
+    const double resumes = lua_tonumber(L, -1);
+    lua_pop(L, 1);
+    manager.Clear();
+    manager.SetTimer(nullptr);
+    if (resumes != 1000.0 * (static_cast<double>(state.iterations()) + 1))
+        state.SkipWithError("every thread must be resumed once a frame");
+    state.SetItemsProcessed(state.iterations() * 1000);
+}
+BENCHMARK(BM_ManageThreads)->Unit(benchmark::kMicrosecond);
 
 BENCHMARK_MAIN();

@@ -12,8 +12,12 @@ local function manager()
     return qe.g_LuaThreadManager.Instance()
 end
 
+local resume, status = coroutine.resume, coroutine.status
+
+-- The clock; during a scheduler pass, the time the pass started (one call into the engine
+-- a frame rather than one a thread).
 local function now()
-    return manager().GetElapsedTime()
+    return threads.pass_time or manager().GetElapsedTime()
 end
 
 local function text(value)
@@ -30,11 +34,11 @@ end
 
 -- Resumes a thread once; a thread that raised is reported, naming its script, and dropped.
 local function step(thread, ...)
-    local ok, wake = coroutine.resume(thread.co, ...)
+    local ok, wake = resume(thread.co, ...)
     if not ok then
         thread.dead = true
         manager().Error("script thread " .. thread.name .. ": " .. tostring(wake))
-    elseif coroutine.status(thread.co) == "dead" then
+    elseif status(thread.co) == "dead" then
         thread.dead = true
     else
         thread.wake = tonumber(wake) or now()
@@ -74,21 +78,26 @@ end
 -- One pass: every thread whose wake time has come is resumed once; threads started during
 -- the pass wait for the next one; finished threads are dropped.
 function ManageThreads()
-    local time = now()
+    local time = manager().GetElapsedTime()
     local list = threads.list
+    threads.pass_time = time
     for i = 1, #list do
         local thread = list[i]
         if not thread.dead and thread.wake <= time then
             step(thread)
         end
     end
-    local alive = {}
-    for _, thread in ipairs(threads.list) do
+    threads.pass_time = nil
+    -- Dropped in place, keeping the order.
+    local kept = 0
+    for i = 1, #list do
+        local thread = list[i]
+        list[i] = nil
         if not thread.dead then
-            table.insert(alive, thread)
+            kept = kept + 1
+            list[kept] = thread
         end
     end
-    threads.list = alive
 end
 
 -- The number of live threads.
