@@ -146,7 +146,9 @@ mluabind::Namespace TreeClasses()
                     .Method("GetLevels", &CQuest::GetLevels)
                     .Method("GetLevelById", &CQuest::GetLevelById)
                     .Method("InsertLevel", &CQuest::InsertLevel)
-                    .Method("RemoveLevel", &CQuest::RemoveLevel));
+                    .Method("RemoveLevel", &CQuest::RemoveLevel)
+                    .Method("Load", &CQuest::Load)
+                    .Method("Save", &CQuest::Save));
     ns.AddClass(Class<CLevel>("CLevel")
                     .BaseClass<CTreeNode>()
                     .Constructor<>()

@@ -5,7 +5,10 @@
 #include "quest/Area.h"
 #include "quest/ImageObject.h"
 #include "quest/Level.h"
+#include "core/Settings.h"
+#include "quest/LuaThreadManager.h"
 #include "quest/QuestBinding.h"
+#include "quest/QuestData.h"
 #include "quest/SceneGroup.h"
 #include "support/TestSupport.h"
 
@@ -111,5 +114,20 @@ TEST_F(QuestBinding, AnObjectHeldFromLuaOutlivesItsRemoval)
     EXPECT_EQ(host.Run("second = nil"), "nil");
     Collect();
     EXPECT_EQ(CountedImage::Alive, 1);
+    EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
+}
+
+TEST_F(QuestBinding, ScriptsReachTheQuestDataAndTheThreadManager)
+{
+    const std::string xml = "<?xml version='1.0'?><Quest><level id='l'><scene id='s'/></level></Quest>";
+    ox::core::CSettings settings;
+    ASSERT_TRUE(settings.LoadXmlFromMemory(xml.data(), xml.size(), "quest.xml"));
+    g_QuestData::Instance().SetBlock(dump::Compile(settings.GetChild("Quest"), "quest.xml"));
+    EXPECT_EQ(host.Run("local l = qe.CLevelPtrT(qe.g_QuestData.Instance().CreateLevel('l')) "
+                       "return l.GetSceneById('s').GetId().c_str()"),
+              "s");
+    EXPECT_EQ(host.Run("return qe.g_QuestData.Instance().CreateLevel('none')"), "nil");
+    EXPECT_EQ(host.Run("return qe.g_LuaThreadManager.Instance().GetElapsedTime()"), "0");
+    g_QuestData::Instance().SetBlock({});
     EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
 }
