@@ -24,10 +24,10 @@ std::string CObjectScripts::MakeFunctionText(const std::string& name, const std:
 
 std::string CObjectScripts::CachedName(const CBaseSceneObject* object, int kind) const
 {
-    auto found = m_Names.find(BaseSceneObjectPtrT(const_cast<CBaseSceneObject*>(object)));
+    auto found = m_Names.find(object);
     if (found == m_Names.end() || kind < 0 || kind >= CBaseSceneObject::ScriptCount)
         return {};
-    return found->second[kind];
+    return found->second.names[kind];
 }
 
 std::string CObjectScripts::FunctionFor(CBaseSceneObject& target, int kind, const std::string& script,
@@ -46,7 +46,9 @@ std::string CObjectScripts::FunctionFor(CBaseSceneObject& target, int kind, cons
                    target.GetIdRef().c_str(), name.c_str());
     } else
         OX_LOG("quest", ox::diag::LogError, "No Lua host 'qe_level' for the script of '%s'", target.GetIdRef().c_str());
-    m_Names[BaseSceneObjectPtrT(&target)][kind] = name;
+    Entry& entry = m_Names[&target];
+    entry.object.reset(&target);
+    entry.names[kind] = name;
     return name;
 }
 

@@ -35,8 +35,12 @@ private:
     std::string FunctionFor(CBaseSceneObject& target, int kind, const std::string& script, bool withEvents,
                             bool isClick);
 
-    // Held, so that an address is never reused for another object while its name is cached.
-    std::map<BaseSceneObjectPtrT, std::array<std::string, CBaseSceneObject::ScriptCount>> m_Names;
+    struct Entry {
+        // Held, so that the address is not reused for another object while names are cached.
+        BaseSceneObjectPtrT object;
+        std::array<std::string, CBaseSceneObject::ScriptCount> names;
+    };
+    std::map<const CBaseSceneObject*, Entry> m_Names;
     unsigned m_Counter = 0;
 };
 

@@ -70,7 +70,8 @@ public:
     {
         StringA88 s;
         memset(static_cast<void*>(&s), 0, sizeof(s));
-        size_t length = text.size();
+        // A fixed string ends at its first zero byte.
+        size_t length = strnlen(text.c_str(), text.size());
         if (length >= StringA88::kCapacity) {
             OX_LOG(kChannel, ox::diag::LogError, "%s: the id '%s' is longer than %zu bytes and is cut", m_File,
                    text.c_str(), StringA88::kCapacity - 1);
@@ -579,13 +580,16 @@ CLevel* BuildLevel(const uint8_t* data, size_t size, const char* id)
     return level;
 }
 
-std::string Describe(const void* data, size_t size)
+std::string Describe(const void* data, size_t size, bool* intact)
 {
     const auto* bytes = static_cast<const uint8_t*>(data);
     uint32_t magic = 0;
     if (size >= 4)
         memcpy(&magic, bytes, 4);
-    if (magic != kMagic)
+    bool ok = magic == kMagic;
+    if (intact)
+        *intact = ok;
+    if (!ok)
         return "not a quest dump (wrong magic)\n";
     std::string text;
     char line[256];
@@ -598,14 +602,18 @@ std::string Describe(const void* data, size_t size)
         text += line;
         Reader r(begin + sizeof(header), end);
         std::string script;
-        if (!r.Text(header.s1Length, script) || !r.Text(header.s2Length, script))
+        if (!r.Text(header.s1Length, script) || !r.Text(header.s2Length, script)) {
+            text += "  a damaged level header\n";
+            ok = false;
             return false;
+        }
         for (uint32_t i = 0; i < header.sceneCount; ++i) {
             const uint8_t* start = r.At();
             SceneHeader scene;
             if (!r.Take(scene) || !IdOf(scene.id, id) || scene.sceneSize < sizeof(scene) ||
                 scene.sceneSize - sizeof(scene) > r.Left()) {
                 text += "  a damaged scene\n";
+                ok = false;
                 return false;
             }
             snprintf(line, sizeof(line), "  scene '%s': flags %u, %u objects, %u areas, %u bytes\n", id.c_str(),
@@ -618,7 +626,10 @@ std::string Describe(const void* data, size_t size)
     if (reached != bytes + size) {
         snprintf(line, sizeof(line), "a damaged level block at byte %zu\n", static_cast<size_t>(reached - bytes));
         text += line;
+        ok = false;
     }
+    if (intact)
+        *intact = ok;
     return text;
 }
 

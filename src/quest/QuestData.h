@@ -126,8 +126,9 @@ std::vector<uint8_t> Compile(const ox::core::CSettingsGroup& quest, const char* 
 // The level `id` built from a block (the first of that id), or null. Used by CQuestData.
 CLevel* BuildLevel(const uint8_t* data, size_t size, const char* id);
 
-// One line per level and scene of a block (ids, counts, sizes); problems are described too.
-std::string Describe(const void* data, size_t size);
+// One line per level and scene of a block (ids, counts, sizes); problems are described too,
+// and `intact` (if given) says whether there were none.
+std::string Describe(const void* data, size_t size, bool* intact = nullptr);
 
 } // namespace dump
 

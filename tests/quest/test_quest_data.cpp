@@ -293,3 +293,25 @@ TEST_F(QuestData, ThePackDumpIsUsedInPlaceAndAWrongMagicIsShown)
     EXPECT_TRUE(data.IsOwned());
     EXPECT_TRUE(LevelPtrT(data.CreateLevel("only_in_xml")));
 }
+
+TEST_F(QuestData, AnIdWithAZeroByteCompilesToWhatTheReaderTakes)
+{
+    using ox::core::CSettingsGroup;
+    using ox::core::SettingsGroupPtrT;
+    auto element = [](const char* name) { return SettingsGroupPtrT(new CSettingsGroup(*ox::core::InternId(name))); };
+    SettingsGroupPtrT quest = element("Quest"), level = element("level"), scene = element("scene");
+    level->AddValue(*ox::core::InternId("id"), "level1");
+    std::string id = "main";
+    id += '\0';
+    id += std::string(90, 'x');
+    scene->AddValue(*ox::core::InternId("id"), id);
+    level->AddChild(scene, scene->GetId());
+    quest->AddChild(level, level->GetId());
+    const std::vector<uint8_t> block = dump::Compile(*quest, "quest.xml");
+    bool intact = false;
+    const std::string description = dump::Describe(block.data(), block.size(), &intact);
+    EXPECT_TRUE(intact) << description;
+    LevelPtrT built = Build(block, "level1");
+    ASSERT_TRUE(built);
+    EXPECT_TRUE(built->GetSceneById("main")) << "the id ends at its zero byte";
+}

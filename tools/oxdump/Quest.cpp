@@ -47,9 +47,10 @@ int Quest(int argc, char** argv)
 
 bool ShowQuest(const uint8_t* data, size_t size, const char* name)
 {
-    const std::string text = qe::dump::Describe(data, size);
+    bool intact = false;
+    const std::string text = qe::dump::Describe(data, size, &intact);
     printf("quest %s\n%s", name, text.c_str());
-    return text.find("damaged") == std::string::npos;
+    return intact;
 }
 
 } // namespace oxdump
