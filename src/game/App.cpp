@@ -11,6 +11,9 @@
 #include "graphics/Font.h"
 #include "misc/Unicode.h"
 #include "misc/sys/Path.h"
+#include "sound/AudioManager.h"
+#include "sound/SoundBinding.h"
+#include "sound/SoundDeclarations.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -60,6 +63,15 @@ void LoadTextures()
     manager.GetTexturesAlpha().Load();
 }
 
+// The sound declarations become the audio manager's sounds; the loader is needed only
+// while they are made.
+void LoadSounds()
+{
+    sound::SoundDeclarationsLoader loader;
+    if (loader.Load())
+        sound::CAudioManager::Instance().LoadDeclarations(loader);
+}
+
 } // namespace
 
 CApp::CApp() = default;
@@ -97,12 +109,16 @@ void CApp::CloseOutput()
     m_OutputRedirected = false;
 }
 
-// The script vocabulary that exists so far: std strings, the Lua host and the file watcher.
+// The script vocabulary that exists so far: std strings, the Lua host, the file watcher and
+// the audio manager.
 void CApp::BindScripts()
 {
     m_Lua->BeginBinding();
     m_Lua->Bind(mluabind::BindStdStrings());
-    m_Lua->Bind(mluabind::Namespace("ox").Merge(lua::BindFileWatcher()).Merge(lua::BindLuaClasses()));
+    m_Lua->Bind(mluabind::Namespace("ox")
+                    .Merge(sound::BindAudioManager())
+                    .Merge(lua::BindFileWatcher())
+                    .Merge(lua::BindLuaClasses()));
     m_Lua->EndBinding();
 }
 
@@ -112,8 +128,7 @@ bool CApp::Init()
     // Lua heap size; the framework's, the game's and the quest engine's script vocabularies
     // with the main script host; after the window the player's options, profiles, music and
     // records before scripts/main.lua; after show_fps the particle and clip declarations;
-    // after the textures the sound declarations; after the fonts the quest data and the edit
-    // widget's forbidden characters.
+    // after the fonts the quest data and the edit widget's forbidden characters.
     lua::SetLuaHeapSize(0x1400000);
     auto adapter = std::make_unique<core::CStandaloneApplicationSdl>(false);
     m_Adapter = adapter.get();
@@ -155,6 +170,7 @@ bool CApp::Init()
     m_ResourceDeclarations.Load("properties/fonts.xml", nullptr);
     LoadTextures();
     m_Demo->TakeDeclaredTextures();
+    LoadSounds();
     // A font finds its glyph image among the declared textures by its image id.
     core::CFontManager& fonts = core::CFontManager::Instance();
     fonts.SetTextureLookup([](const char* id) -> const graphics::CTexture* {
@@ -182,6 +198,9 @@ void CApp::ProcessEvent()
         if (event->wParam == core::VK_PRIOR || event->wParam == core::VK_NEXT)
             LimitFPS(g_FpsLimit);
     }
+    // The demo's stand-in for the game's windows answers a click with a sound.
+    if (m_Demo && event->message == core::WM_LBUTTONDOWN && IsActive())
+        sound::PlaySound("click");
     CApplication::ProcessEvent();
 }
 

@@ -32,6 +32,7 @@ public:
             Close();
             return false;
         }
+        m_Previous = alcGetCurrentContext();
         alcMakeContextCurrent(m_Context);
         const ALfloat orientation[] = {0.0f, 0.0f, -1.0f, 0.0f, 1.0f, 0.0f};
         alListener3f(AL_POSITION, 0.0f, 0.0f, 0.0f);
@@ -45,7 +46,10 @@ public:
     void Close() override
     {
         if (m_Context) {
-            alcMakeContextCurrent(nullptr);
+            // A device opened while another one was open (tests do) hands the other's
+            // context back.
+            if (alcGetCurrentContext() == m_Context)
+                alcMakeContextCurrent(m_Previous);
             alcDestroyContext(m_Context);
             m_Context = nullptr;
         }
@@ -169,6 +173,7 @@ private:
 
     ALCdevice* m_Device = nullptr;
     ALCcontext* m_Context = nullptr;
+    ALCcontext* m_Previous = nullptr;
     std::thread::id m_OpenThread;
 };
 

@@ -362,6 +362,13 @@ void CSound::SetPriority(int priority)
     RefreshGain();
 }
 
+void CSound::SetRepeatCount(int count)
+{
+    CBaseSound::SetRepeatCount(count);
+    if (m_Source)
+        m_Source->SetLooping(m_RepeatCount == -1);
+}
+
 void CSound::SetBalance(float value, float time, float delay)
 {
     CBaseSound::SetBalance(value, time, delay);

@@ -184,6 +184,8 @@ public:
 
     void AdjustVolume(float delta, float time, float delay) override;
     void SetPriority(int priority) override;
+    // A sound that stops repeating without end plays to the end of its file.
+    void SetRepeatCount(int count) override;
     void SetBalance(float value, float time, float delay) override;
     void SetSpeed(float speed) override;
 
