@@ -222,7 +222,8 @@ unsigned COggVorbisStream::Read(void* data, unsigned max_size)
 
 bool COggVorbisStream::Seek(double seconds)
 {
-    if (!IsOpen() || seconds < 0.001)
+    // Beyond a few days no file reaches: that keeps the sample arithmetic in range.
+    if (!IsOpen() || !(seconds >= 0.001 && seconds < 1e6))
         return false;
     const int64_t target = static_cast<int64_t>(m_Rate * seconds);
     int64_t lo = 0, hi = m_Size, found = -1, foundGranule = 0;
@@ -259,7 +260,8 @@ bool COggVorbisStream::Seek(double seconds)
     OX_ASSERT_A(ogg_page_granulepos(&m_OggIter.GetCurrentPage()) == foundGranule);
     const int result = vorbis_synthesis_restart(&m_Dsp);
     OX_ASSERT_A(result == 0);
-    int64_t pcm_bytes_to_skip = (target - foundGranule) * 2 * m_Info.channels;
+    // A damaged page may claim a position far below the start: it counts as the start.
+    int64_t pcm_bytes_to_skip = (target - std::max<int64_t>(foundGranule, -1)) * 2 * m_Info.channels;
     OX_ASSERT_A(pcm_bytes_to_skip >= 0);
     while (pcm_bytes_to_skip > 0) {
         const unsigned read = Read(nullptr, static_cast<unsigned>(std::min<int64_t>(pcm_bytes_to_skip, 1 << 30)));

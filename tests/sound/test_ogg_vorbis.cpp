@@ -6,6 +6,9 @@
 #include "support/SoundFiles.h"
 #include "support/TestSupport.h"
 
+#include <ogg/ogg.h>
+
+#include <climits>
 #include <cmath>
 #include <cstring>
 
@@ -211,4 +214,27 @@ TEST(OggVorbisStream, OpensFilesOfThePackAndNamesAMissingOne)
     EXPECT_FALSE(stream.Open("sounds/nothere.ogg"));
     EXPECT_FALSE(stream.IsOpen());
     EXPECT_TRUE(log.Contains("sound file sounds/nothere.ogg is missing"));
+}
+
+TEST(OggVorbisStream, SeekingInAFileOfDamagedGranulesStaysInRange)
+{
+    // Every page claims a position far below zero (checksums made right): a seek finds no
+    // sensible page, must not overflow, and decodes on from the start.
+    std::vector<uint8_t> file = MakeToneOgg(2, 8000, 16000);
+    auto pages = oxtest::OggPages(file);
+    file.clear();
+    for (size_t p = 0; p < pages.size(); ++p) {
+        const int64_t granule = INT64_MIN / 3 + static_cast<int64_t>(p);
+        memcpy(pages[p].data() + 6, &granule, 8);
+        ogg_page page {pages[p].data(), 27 + pages[p][26], pages[p].data() + 27 + pages[p][26],
+                       static_cast<long>(pages[p].size() - 27 - pages[p][26])};
+        ogg_page_checksum_set(&page);
+        file.insert(file.end(), pages[p].begin(), pages[p].end());
+    }
+    oxtest::LogCapture log;
+    OpenedStream s(file, "granules.ogg");
+    ASSERT_TRUE(s.stream.IsOpen());
+    s.stream.Seek(0.5);
+    EXPECT_FALSE(log.Contains("pcm_bytes_to_skip"));
+    EXPECT_FALSE(s.stream.Seek(1e300));
 }
