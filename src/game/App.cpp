@@ -177,6 +177,11 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     });
     fonts.LoadGroup(m_ResourceDeclarations, nullptr);
+    // Until a load window does it, loading completes here and the scripts' Run follows.
+    if (m_Demo) {
+        Load();
+        lua::CallLuaFunction(m_Lua.get(), "Run");
+    }
     return true;
 }
 

@@ -150,6 +150,10 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     // The declared textures are known, and none of them failed to load.
     EXPECT_NE(log.find("[texman][0]: Texture information created in"), std::string::npos) << log;
     EXPECT_EQ(log.find("[texman][3]"), std::string::npos) << log;
+    // The sounds are declared and the music plays (on OpenAL's null output), without a problem.
+    EXPECT_NE(run.Output().find("Lantern Demo Run: music plays"), std::string::npos) << run.Output();
+    EXPECT_EQ(log.find("[sound][2]"), std::string::npos) << log;
+    EXPECT_EQ(log.find("[sound][3]"), std::string::npos) << log;
     EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
     EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
 }
