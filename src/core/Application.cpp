@@ -87,6 +87,9 @@ CApplication::CApplication()
     CreateDataFolder(ownFolder);
 
     diag::Log::Instance().SetFile(misc::WideToUtf8(m_AppDataFolder) + "/log.oxlog");
+    // The first use of the audio manager starts the sound output; it pauses with the game.
+    GetAudioManager();
+    m_MediaHooks.audio = [](bool pause) { sound::CAudioManager::Instance().PauseAll(pause); };
     OX_LOG("app", diag::LogInfo, "app created");
     if (ownFolder.empty())
         OX_LOG("data", diag::LogWarning,
@@ -140,6 +143,7 @@ bool CApplication::Init()
         return false;
     }
     CTextureManager::Instance().SetAllOnDemand(allOnDemand);
+    GetAudioManager().SetOnDemand(allOnDemand);
     m_Renderer.AddDeviceResourceOwner(&CTextureManager::Instance());
     graphics::CImage::SetTextureLookup([](const char* id) { return CTextureManager::Instance().GetItem(id); });
     // The display modes can be listed once the platform layer is up.
@@ -188,6 +192,8 @@ void CApplication::Update()
     graphics::SetFrameNumber(graphics::GetFrameNumber() + 1);
     lua::CLua::StepGarbageCollector(g_FrameTime);
     GetTimeManager().Update();
+    GetAudioManager().SetStatistics(m_DebugLevel >= DebugHeavy);
+    GetAudioManager().Update();
     CTextureManager::Instance().UpdatePreload();
     DoUpdate();
     if (m_ShutdownRequested)

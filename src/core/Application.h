@@ -9,6 +9,7 @@
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
 #include "misc/WideChar.h"
+#include "sound/AudioManager.h"
 
 #include <functional>
 #include <memory>
@@ -18,8 +19,8 @@ namespace ox::core {
 enum AppState : uint32_t { Created = 0, Loading = 1, LoadingPaused = 2, Running = 3, ShuttingDown = 4 };
 enum DebugLevel : int { DebugNone = 0, DebugCheats = 1, DebugLight = 2, DebugHeavy = 3 };
 
-// Media that pause while the application is in the background. Audio and video register
-// here as they exist; nothing is registered by the framework itself.
+// Media that pause while the application is in the background. The audio manager is
+// registered by the application; video registers here when it exists.
 struct MediaPauseHooks {
     std::function<void(bool pause)> audio;
     std::function<void(bool pause)> video;
@@ -59,6 +60,7 @@ public:
     CSettings& GetSettings() { return m_Settings; }
     CResourceDeclarations& GetResourceDeclarations() { return m_ResourceDeclarations; }
     graphics::CRenderer* GetRenderer() { return &m_Renderer; }
+    sound::CAudioManager& GetAudioManager() { return sound::CAudioManager::Instance(); }
     CSystemIntegration* GetSystemIntegration() const { return m_SystemIntegration.get(); }
     // The application owns the adapter from here on: it goes only after the application,
     // so nothing that can reach the application finds it deleted.

@@ -15,6 +15,9 @@
 #include "misc/animation/ClipsLoader.h"
 #include "misc/sys/Path.h"
 #include "quest/QuestBinding.h"
+#include "sound/AudioManager.h"
+#include "sound/SoundBinding.h"
+#include "sound/SoundDeclarations.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -64,6 +67,15 @@ void LoadTextures()
     manager.GetTexturesAlpha().Load();
 }
 
+// The sound declarations become the audio manager's sounds; the loader is needed only
+// while they are made.
+void LoadSounds()
+{
+    sound::SoundDeclarationsLoader loader;
+    if (loader.Load())
+        sound::CAudioManager::Instance().LoadDeclarations(loader);
+}
+
 } // namespace
 
 CApp::CApp() = default;
@@ -102,13 +114,16 @@ void CApp::CloseOutput()
     m_OutputRedirected = false;
 }
 
-// The script vocabulary that exists so far: std strings, the Lua host and the file watcher,
-// then the quest tree.
+// The script vocabulary that exists so far: std strings, the Lua host, the file watcher and
+// the audio manager, then the quest tree.
 void CApp::BindScripts()
 {
     m_Lua->BeginBinding();
     m_Lua->Bind(mluabind::BindStdStrings());
-    m_Lua->Bind(mluabind::Namespace("ox").Merge(lua::BindFileWatcher()).Merge(lua::BindLuaClasses()));
+    m_Lua->Bind(mluabind::Namespace("ox")
+                    .Merge(sound::BindAudioManager())
+                    .Merge(lua::BindFileWatcher())
+                    .Merge(lua::BindLuaClasses()));
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
@@ -163,6 +178,7 @@ bool CApp::Init()
     m_ResourceDeclarations.Load("properties/fonts.xml", nullptr);
     LoadTextures();
     m_Demo->TakeDeclaredTextures();
+    LoadSounds();
     // A font finds its glyph image among the declared textures by its image id.
     core::CFontManager& fonts = core::CFontManager::Instance();
     fonts.SetTextureLookup([](const char* id) -> const graphics::CTexture* {
@@ -178,6 +194,11 @@ bool CApp::Init()
     m_Demo->StartClip();
     gui::CBaseWidget::SetDebugRender(core::ReadBool(settings, "debug_render"));
     m_Demo->LoadPanel(m_Settings.GetChild("gui"), m_Settings.GetChild("GUITemplates"));
+    // Until a load window does it, loading completes here and the scripts' Run follows.
+    if (m_Demo) {
+        Load();
+        lua::CallLuaFunction(m_Lua.get(), "Run");
+    }
     return true;
 }
 
@@ -199,6 +220,9 @@ void CApp::ProcessEvent()
         if (event->wParam == core::VK_PRIOR || event->wParam == core::VK_NEXT)
             LimitFPS(g_FpsLimit);
     }
+    // The demo's stand-in for the game's windows answers a click with a sound.
+    if (m_Demo && event->message == core::WM_LBUTTONDOWN && IsActive())
+        sound::PlaySound("click");
     CApplication::ProcessEvent();
 }
 

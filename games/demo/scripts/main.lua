@@ -20,9 +20,22 @@ function Init()
           (lfs and "present" or "missing"))
 end
 
+-- Each kind of sound has a volume group of its own (properties/sounds.xml).
+local volumes = { music = 60, clicks = 90, windows = 80, found = 100 }
+
 function Run()
     lantern.lit = lantern.lit + 1
     print("Lantern Demo Run: the lantern is lit (" .. lantern.lit .. ")")
+    local audio = ox.core.CAudioManager.Instance()
+    for group, volume in pairs(volumes) do
+        audio.SetGroupVolume(group, volume)
+    end
+    -- The music loops without end; it starts once, whatever runs this again.
+    if not (lantern.music and audio.IsSound(lantern.music)) then
+        lantern.music = audio.Play("music", -2, -2, -2, -2, -2)
+    end
+    print("Lantern Demo Run: music " .. (lantern.music ~= 0 and "plays" or "is silent") ..
+          (audio.IsAudioAvailable() and "" or " (no audio output)"))
 end
 
 function quest.OnClose()
