@@ -191,6 +191,8 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     };
     clips.fonts = [](const char* id) -> const graphics::CFont* { return core::CFontManager::Instance().GetItem(id); };
+    m_ClipAudio = std::make_unique<misc::anim::CClipAudio>(sound::CAudioManager::Instance());
+    clips.sounds = m_ClipAudio.get();
     m_Demo->StartClip();
     gui::CBaseWidget::SetDebugRender(core::ReadBool(settings, "debug_render"));
     m_Demo->LoadPanel(m_Settings.GetChild("gui"), m_Settings.GetChild("GUITemplates"));

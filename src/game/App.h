@@ -6,6 +6,7 @@
 #include "core/platform/StandaloneApplicationSdl.h"
 #include "game/DemoScene.h"
 #include "lua/Lua.h"
+#include "misc/animation/ClipAudio.h"
 
 #include <cstdio>
 #include <memory>
@@ -52,6 +53,8 @@ private:
     InitFailure m_InitFailure = InitFailure::None;
     // Drawn until the game's windows exist.
     std::unique_ptr<CDemoScene> m_Demo;
+    // Clip objects' sound points, played through the audio manager.
+    std::unique_ptr<ox::misc::anim::CClipAudio> m_ClipAudio;
     // Serves the fonts' glyph images until the texture manager does.
     bool m_OutputRedirected = false;
     // A missing ManageThreads was reported; it is reported again only after it existed.

@@ -3,6 +3,8 @@
 // lengths, the statistics, and a game without an output.
 #include "lua/LuaTestHost.h"
 #include "misc/GamePack.h"
+#include "misc/animation/ClipAudio.h"
+#include "misc/animation/ClipObjects.h"
 #include "sound/AudioManager.h"
 #include "sound/SoundBinding.h"
 #include "support/RecordingSoundDevice.h"
@@ -372,4 +374,27 @@ TEST(SoundPlayer, PlaysByIdAndCanBeReplaced)
     EXPECT_EQ(PlaySound(nullptr), 0u);
     EXPECT_EQ(played, std::vector<std::string> {"door_open"});
     SetSoundPlayer(previous);
+}
+
+TEST_F(AudioManagerTest, ClipSoundPointsPlayThroughTheManagerAndStopByOwner)
+{
+    dir.Write("properties/sounds.xml", "<?xml version=\"1.0\"?>\n<sounds>\n" +
+                                           Sound("blip", "sounds/click.ogg", "sfx", 100, 1, -1) + "</sounds>\n");
+    MakeManager(true);
+    ox::misc::anim::CClipAudio audio(*manager);
+    ox::misc::anim::CImageObject first, second;
+
+    audio.Play(first, "blip", 0);
+    audio.Play(second, "blip", 50); // starts 50 ms in
+    ASSERT_EQ(audio.Count(), 2u);
+    audio.Play(second, "blip", 150); // its 100 ms are over before it could start
+    audio.Play(second, "nothing", 0);
+    EXPECT_EQ(audio.Count(), 2u);
+    EXPECT_EQ(manager->IsSound("blip"), true);
+
+    audio.StopAll(first);
+    EXPECT_EQ(audio.Count(), 1u) << "only the first object's sound ends";
+    Run(200);
+    audio.Pause(second, true);
+    EXPECT_EQ(audio.Count(), 0u) << "finished sounds leave the list";
 }
