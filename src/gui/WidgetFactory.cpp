@@ -1,5 +1,7 @@
 #include "gui/WidgetFactory.h"
 
+#include "gui/LuaWidget.h"
+
 namespace ox::gui {
 
 void CWidgetFactory::RegisterWidget(std::string_view name, CreatorT creator)
@@ -28,6 +30,14 @@ CWidgetFactory& GetWidgetFactory()
 {
     static auto* factory = new CWidgetFactory();
     return *factory;
+}
+
+void RegisterFrameworkWidgets(CWidgetFactory& factory)
+{
+    // In the framework's order: label, image, button, checkbox, scroll, list, combo box,
+    // edit, slider, tab, table, image box, radio group and progress bar widgets come with the
+    // controls; then the Lua widget; the clip, toolbar and tree widgets come with theirs.
+    factory.RegisterWidget<CLuaWidget>("lua_widget");
 }
 
 } // namespace ox::gui

@@ -41,4 +41,8 @@ private:
 // The factory the descriptions are built with, for the whole run.
 CWidgetFactory& GetWidgetFactory();
 
+// Registers the framework's widget kinds in their order. Kinds whose classes don't exist yet
+// are not registered: a description naming one logs a line and skips it.
+void RegisterFrameworkWidgets(CWidgetFactory& factory);
+
 } // namespace ox::gui
