@@ -5,6 +5,8 @@
 #include "core/TextureDeclarations.h"
 #include "core/TextureManager.h"
 #include "diag/Log.h"
+#include "game/LoadWindow.h"
+#include "gui/Cursor.h"
 #include "lua/LuaBinding.h"
 #include "lua/LuaHeap.h"
 #include "lua/mluabind/StdBinding.h"
@@ -178,6 +180,25 @@ bool CApp::Init()
     return true;
 }
 
+gui::BaseWindowPtrT CApp::CreateLoadWindow()
+{
+    gui::BaseWindowPtrT window(new CLoadWindow(*this));
+    const core::CSettingsGroup& node = m_Settings.GetChildByAttribute("window", "id", "loading", true);
+    if (&node == &core::CSettingsGroup::Empty())
+        OX_LOG("data", diag::LogWarning, "no <window id=\"loading\"> in the GUI description: the first window is empty");
+    window->Load(node, m_Settings.GetChild("GUITemplates"));
+    return window;
+}
+
+void CApp::OnLoadComplete()
+{
+    gui::CCursor& cursor = gui::CCursor::Instance();
+    cursor.EnableCustomCursors(true);
+    cursor.Refresh();
+    if (m_Lua)
+        lua::CallLuaFunction(m_Lua.get(), "Run");
+}
+
 void CApp::OnStop()
 {
     if (m_Lua)
@@ -201,9 +222,10 @@ void CApp::ProcessEvent()
 
 void CApp::DoDraw(graphics::CRenderer* renderer)
 {
-    CApplication::DoDraw(renderer);
+    // The test scene under the windows.
     if (m_Demo)
         m_Demo->Draw(*renderer, m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
+    CApplication::DoDraw(renderer);
     DrawFps(renderer);
 }
 
