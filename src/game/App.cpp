@@ -7,6 +7,7 @@
 #include "diag/Log.h"
 #include "game/LoadWindow.h"
 #include "gui/Cursor.h"
+#include "gui/GuiBinding.h"
 #include "lua/LuaBinding.h"
 #include "lua/LuaHeap.h"
 #include "lua/mluabind/StdBinding.h"
@@ -103,12 +104,16 @@ void CApp::CloseOutput()
     m_OutputRedirected = false;
 }
 
-// The script vocabulary that exists so far: std strings, the Lua host and the file watcher.
+// The script vocabulary that exists so far: std strings, the Lua host, the file watcher and
+// the GUI's windows and widgets.
 void CApp::BindScripts()
 {
     m_Lua->BeginBinding();
     m_Lua->Bind(mluabind::BindStdStrings());
-    m_Lua->Bind(mluabind::Namespace("ox").Merge(lua::BindFileWatcher()).Merge(lua::BindLuaClasses()));
+    m_Lua->Bind(mluabind::Namespace("ox")
+                    .Merge(lua::BindFileWatcher())
+                    .Merge(lua::BindLuaClasses())
+                    .Merge(gui::BindGui()));
     m_Lua->EndBinding();
 }
 
