@@ -398,7 +398,8 @@ bool CStandaloneApplicationSdl::PumpMessages()
     };
     if (m_VideoReady) {
         SDL_Event event;
-        while (!m_StopRequested && SDL_PollEvent(&event)) {
+        // A nested loop told to stop leaves the rest of the events to the loop it returns to.
+        while (!m_StopRequested && !m_StopNestedRequested && SDL_PollEvent(&event)) {
             TranslateSdlEvent(event, CurrentState(event), records);
             dispatchAll();
         }
