@@ -11,6 +11,18 @@ void CWidgetFactory::RegisterWidget(std::string_view name, CreatorT creator)
 
 bool CWidgetFactory::IsRegistered(std::string_view name) const { return m_Creators.find(name) != m_Creators.end(); }
 
+CWidgetFactory::CreatorT CWidgetFactory::GetCreator(std::string_view name) const
+{
+    auto found = m_Creators.find(name);
+    return found == m_Creators.end() ? CreatorT() : found->second;
+}
+
+void CWidgetFactory::UnregisterWidget(std::string_view name)
+{
+    if (auto found = m_Creators.find(name); found != m_Creators.end())
+        m_Creators.erase(found);
+}
+
 WidgetPtrT CWidgetFactory::Create(std::string_view name) const
 {
     auto found = m_Creators.find(name);

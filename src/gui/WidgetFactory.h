@@ -18,6 +18,9 @@ public:
     // A later registration of a name replaces the earlier one.
     void RegisterWidget(std::string_view name, CreatorT creator);
     bool IsRegistered(std::string_view name) const;
+    // The creator of a kind, or an empty one.
+    CreatorT GetCreator(std::string_view name) const;
+    void UnregisterWidget(std::string_view name);
     // A new widget of the kind, or null for an unknown name.
     WidgetPtrT Create(std::string_view name) const;
     // The same, loaded from `node`.
