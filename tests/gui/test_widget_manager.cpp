@@ -186,3 +186,39 @@ TEST_F(WidgetManagerTest, BlockedInputAndDisabledOrDeadMainWindows)
     app->Update();
     EXPECT_EQ(app->GetMainWindow(), nullptr);
 }
+
+TEST_F(WidgetManagerTest, CursorFollowsTheWidgetUnderThePointer)
+{
+    struct HandProbe : ProbeWidget {
+        bool OnMouseMove(const IntVector&, int, bool broadcast) override
+        {
+            if (!broadcast)
+                CCursor::Instance().SetCursor(CCursor::CursorHand);
+            return !broadcast;
+        }
+    };
+    boost::intrusive_ptr<HandProbe> hand(new HandProbe());
+    hand->SetOffset(400, 400);
+    hand->SetSize(100, 100);
+    window->AddWidget(hand);
+    CCursor& cursor = CCursor::Instance();
+
+    oxtest::SendMove(*platform, 450, 450);
+    EXPECT_EQ(platform->cursorType, static_cast<unsigned>(CCursor::CursorHand));
+    oxtest::SendMove(*platform, 10, 10);
+    EXPECT_EQ(platform->cursorType, static_cast<unsigned>(CCursor::CursorPointer));
+    EXPECT_TRUE(platform->cursorVisible);
+
+    // Hidden, the pointer goes at the next update; custom cursors without their textures
+    // leave the platform's pointer.
+    cursor.HideCursor(true);
+    app->Update();
+    EXPECT_FALSE(platform->cursorVisible);
+    cursor.HideCursor(false);
+    cursor.EnableCustomCursors(true);
+    oxtest::SendMove(*platform, 450, 450);
+    EXPECT_EQ(cursor.GetCurrentImage(), nullptr);
+    EXPECT_TRUE(platform->cursorVisible);
+    EXPECT_EQ(platform->cursorType, static_cast<unsigned>(CCursor::CursorHand));
+    cursor.EnableCustomCursors(false);
+}

@@ -314,3 +314,29 @@ TEST_F(ScriptedWindow, FailingHooksAreReportedAndAHookMayCloseItsWindow)
     EXPECT_EQ(parent->GetChildWindow(), nullptr);
     EXPECT_EQ(BoxCount(boxes, "Lua Error"), 2u);
 }
+
+TEST_F(ScriptedWindow, ScriptsMakeWindowsAndHandThemOver)
+{
+    EXPECT_EQ(Eval("ox.gui.OX_SPACE"), "10010");
+    EXPECT_EQ(Eval("ox.gui.OX_OEM_2"), "10027");
+    EXPECT_EQ(Eval("ox.gui.CWidget.FlagDead"), "8");
+    EXPECT_EQ(Eval("ox.gui.g_Cursor.Instance().GetCursor() == ox.gui.CCursor.Instance().GetCursor()"), "true");
+
+    // A window made by a script goes into the keeping of the window it is put on: the script
+    // may drop it, and it goes when that window lets it go.
+    Run(R"(function PutOn(parent)
+               local made = ox.gui.CWindow()
+               made.SetCanDrag(false)
+               parent.AddChildWindow(made)
+           end)");
+    auto parent = LoadWindow(R"(<window id="parent"/>)");
+    ox::lua::CallLuaFunction(lua, "PutOn", static_cast<CBaseWindow*>(parent.get()));
+    Run("collectgarbage('collect')");
+    auto* child = dynamic_cast<CWindow*>(parent->GetChildWindow());
+    ASSERT_NE(child, nullptr);
+    EXPECT_FALSE(child->IsCanDrag());
+    EXPECT_EQ(child->GetRefCount(), 1);
+    parent->RemoveChildWindow();
+    Run("collectgarbage('collect')");
+    EXPECT_EQ(BoxCount(boxes, "Lua Error"), 0u);
+}
