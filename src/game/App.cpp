@@ -5,6 +5,9 @@
 #include "core/TextureDeclarations.h"
 #include "core/TextureManager.h"
 #include "diag/Log.h"
+#include "game/LoadWindow.h"
+#include "gui/Cursor.h"
+#include "gui/GuiBinding.h"
 #include "lua/LuaBinding.h"
 #include "lua/LuaHeap.h"
 #include "lua/mluabind/StdBinding.h"
@@ -115,7 +118,7 @@ void CApp::CloseOutput()
 }
 
 // The script vocabulary that exists so far: std strings, the Lua host, the file watcher and
-// the audio manager, then the quest tree.
+// the audio manager and the GUI's windows and widgets, then the quest tree.
 void CApp::BindScripts()
 {
     m_Lua->BeginBinding();
@@ -123,7 +126,8 @@ void CApp::BindScripts()
     m_Lua->Bind(mluabind::Namespace("ox")
                     .Merge(sound::BindAudioManager())
                     .Merge(lua::BindFileWatcher())
-                    .Merge(lua::BindLuaClasses()));
+                    .Merge(lua::BindLuaClasses())
+                    .Merge(gui::BindGui()));
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
@@ -196,12 +200,26 @@ bool CApp::Init()
     m_Demo->StartClip();
     gui::CBaseWidget::SetDebugRender(core::ReadBool(settings, "debug_render"));
     m_Demo->LoadPanel(m_Settings.GetChild("gui"), m_Settings.GetChild("GUITemplates"));
-    // Until a load window does it, loading completes here and the scripts' Run follows.
-    if (m_Demo) {
-        Load();
-        lua::CallLuaFunction(m_Lua.get(), "Run");
-    }
     return true;
+}
+
+gui::BaseWindowPtrT CApp::CreateLoadWindow()
+{
+    gui::BaseWindowPtrT window(new CLoadWindow(*this));
+    const core::CSettingsGroup& node = m_Settings.GetChildByAttribute("window", "id", "loading", true);
+    if (&node == &core::CSettingsGroup::Empty())
+        OX_LOG("data", diag::LogWarning, "no <window id=\"loading\"> in the GUI description: the first window is empty");
+    window->Load(node, m_Settings.GetChild("GUITemplates"));
+    return window;
+}
+
+void CApp::OnLoadComplete()
+{
+    gui::CCursor& cursor = gui::CCursor::Instance();
+    cursor.EnableCustomCursors(true);
+    cursor.Refresh();
+    if (m_Lua)
+        lua::CallLuaFunction(m_Lua.get(), "Run");
 }
 
 void CApp::OnStop()
@@ -222,17 +240,15 @@ void CApp::ProcessEvent()
         if (event->wParam == core::VK_PRIOR || event->wParam == core::VK_NEXT)
             LimitFPS(g_FpsLimit);
     }
-    // The demo's stand-in for the game's windows answers a click with a sound.
-    if (m_Demo && event->message == core::WM_LBUTTONDOWN && IsActive())
-        sound::PlaySound("click");
     CApplication::ProcessEvent();
 }
 
 void CApp::DoDraw(graphics::CRenderer* renderer)
 {
-    CApplication::DoDraw(renderer);
+    // The test scene under the windows.
     if (m_Demo)
         m_Demo->Draw(*renderer, m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
+    CApplication::DoDraw(renderer);
     DrawFps(renderer);
 }
 

@@ -26,6 +26,12 @@ public:
     void DoDraw(ox::graphics::CRenderer* renderer) override;
     void DoUpdate() override;
 
+    // The first window, made from the description <window id="loading">: it runs the loading
+    // and then the scripts' Run.
+    ox::gui::BaseWindowPtrT CreateLoadWindow();
+    // Loading is through: custom cursors on, then the script function Run.
+    void OnLoadComplete();
+
     // The working folder at start: the game folder.
     void ReadGameFolder();
     const ox::wstring& GetGameFolder() const { return m_GameFolder; }

@@ -38,6 +38,56 @@ function Run()
           (audio.IsAudioAvailable() and "" or " (no audio output)"))
 end
 
+-- The first window's hooks (gui.xml, window "loading"). Each gets the window first. A
+-- mouse or key hook takes the place of the window's own handling: SuperOn... runs that.
+DemoWindow = DemoWindow or {}
+
+function DemoWindow.OnChildAction(self, action, sender)
+    print("DemoWindow: " .. text(action) .. " " .. text(sender.GetId()))
+    return true
+end
+
+function DemoWindow.OnMouseDown(self, x, y, button, keys, broadcast)
+    if not broadcast then
+        print(string.format("DemoWindow: mouse down at %d,%d, button %d", x, y, button))
+        ox.core.CAudioManager.Instance().Play("click", -2, -2, -2, -2, -2)
+    end
+    return self.SuperOnMouseDown(x, y, button, keys, broadcast)
+end
+
+function DemoWindow.OnKeyDown(self, key, keys, raw, broadcast)
+    if key == ox.gui.OX_SPACE then
+        lantern.lit = lantern.lit + 1
+        print("DemoWindow: Space, the lantern is lit (" .. lantern.lit .. ")")
+    elseif key ~= ox.gui.OX_NONE then
+        print("DemoWindow: key " .. key)
+    end
+    return self.SuperOnKeyDown(key, keys, raw, broadcast)
+end
+
+-- The modal dialog's hooks (gui.xml, window "demo_dialog"): OK, Cancel and Escape end it.
+DemoDialog = DemoDialog or {}
+
+function DemoDialog.OnChildAction(self, action, sender)
+    local id = text(sender.GetId())
+    print("DemoDialog: " .. text(action) .. " " .. id)
+    if id == "ok" then
+        self.EndModal(1)
+    elseif id == "cancel" then
+        self.EndModal(0)
+    end
+    return true
+end
+
+function DemoDialog.OnKeyDown(self, key, keys, raw, broadcast)
+    if key == ox.gui.OX_ESC then
+        print("DemoDialog: Escape")
+        self.EndModal(0)
+        return true
+    end
+    return self.SuperOnKeyDown(key, keys, raw, broadcast)
+end
+
 function quest.OnClose()
     print("Lantern Demo quest.OnClose: the lantern goes out")
 end
