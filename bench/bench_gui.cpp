@@ -6,6 +6,8 @@
 #include "graphics/Texture.h"
 #include "gui/LayoutBox.h"
 #include "gui/WidgetFactory.h"
+#include "gui/WidgetManager.h"
+#include "gui/Window.h"
 
 #include <benchmark/benchmark.h>
 
@@ -143,5 +145,97 @@ static void BM_LayoutPass(benchmark::State& state)
     state.counters["boxes"] = static_cast<double>(boxes);
 }
 BENCHMARK(BM_LayoutPass)->Arg(59)->Unit(benchmark::kMicrosecond);
+
+namespace {
+
+// The widget a click is meant for: it takes the press and the release, and asks for the
+// broadcast release as a button does.
+class TargetWidget : public CWidget {
+public:
+    unsigned downs = 0, ups = 0;
+    TargetWidget() : CWidget({}, LayerTop, BroadcastOnMouseUp) {}
+    bool OnMouseDown(const ox::misc::IntVector&, MouseButtons, int, bool broadcast) override
+    {
+        downs += broadcast ? 0 : 1;
+        return true;
+    }
+    bool OnMouseUp(const ox::misc::IntVector&, MouseButtons, int, bool broadcast) override
+    {
+        ups += broadcast ? 0 : 1;
+        return !broadcast;
+    }
+};
+
+// A side branch of a tree: a widget holding four children, each holding five: 25 widgets.
+WidgetPtrT SideBranch(ox::misc::FloatVector at)
+{
+    WidgetPtrT branch(new CWidget());
+    branch->SetOffset(at.X, at.Y);
+    branch->SetSize(40, 40);
+    for (int i = 0; i < 4; ++i) {
+        WidgetPtrT child(new CWidget());
+        child->SetOffset(2.0f * static_cast<float>(i), 2);
+        child->SetSize(8, 8);
+        for (int j = 0; j < 5; ++j) {
+            WidgetPtrT leaf(new CWidget());
+            leaf->SetSize(2, 2);
+            child->AddWidget(leaf);
+        }
+        branch->AddWidget(child);
+    }
+    return branch;
+}
+
+// A window whose tree is `depth` levels deep along the path to the target at the canvas
+// point (500, 400). On each level the path's widget stands behind four siblings (so the hit
+// test tries them first), each a side branch of 25 widgets: 101 widgets a level.
+boost::intrusive_ptr<CWindow> ClickTree(int depth, TargetWidget*& target, unsigned& count)
+{
+    boost::intrusive_ptr<CWindow> window(new CWindow());
+    window->SetSize(1024, 768);
+    CBaseWidget* parent = window.get();
+    count = 1;
+    for (int level = 0; level < depth; ++level) {
+        const bool last = level == depth - 1;
+        WidgetPtrT path(last ? static_cast<CWidget*>(target = new TargetWidget()) : new CWidget());
+        path->SetOffset(10, 10);
+        path->SetSize(1000 - 20.0f * static_cast<float>(level), 700 - 20.0f * static_cast<float>(level));
+        parent->AddWidget(path);
+        for (int i = 0; i < 4; ++i) {
+            parent->AddWidget(SideBranch({45.0f * static_cast<float>(i), 0}));
+            count += 25;
+        }
+        count += 1;
+        parent = path.get();
+    }
+    return window;
+}
+
+} // namespace
+
+// A left click, the press and the release as the platform delivers them, through the widget
+// manager's two passes each, down a 20-deep tree of 2,021 widgets to the hit widget.
+static void BM_ClickDispatch(benchmark::State& state)
+{
+    TargetWidget* target = nullptr;
+    unsigned count = 0;
+    CWidgetManager manager;
+    manager.SetActiveRect({0, 0, 1024, 768}, {1, 1});
+    manager.SetMainWindow(ClickTree(static_cast<int>(state.range(0)), target, count));
+    manager.Update();
+    ox::core::SystemEvent down, up;
+    down.message = ox::core::WM_LBUTTONDOWN;
+    up.message = ox::core::WM_LBUTTONUP;
+    down.lParam = up.lParam = ox::core::MakeLong(500, 400);
+    for (auto _ : state) {
+        manager.OnWindowMessage(down);
+        manager.OnWindowMessage(up);
+    }
+    if (target->downs != state.iterations() || target->ups != state.iterations())
+        state.SkipWithError("the clicks did not reach the target widget");
+    state.SetItemsProcessed(state.iterations());
+    state.counters["widgets"] = static_cast<double>(count);
+}
+BENCHMARK(BM_ClickDispatch)->Arg(20)->Unit(benchmark::kMicrosecond);
 
 BENCHMARK_MAIN();

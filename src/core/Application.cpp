@@ -6,6 +6,9 @@
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "graphics/Image.h"
+#include "gui/Cursor.h"
+#include "gui/GuiServices.h"
+#include "gui/WidgetFactory.h"
 #include "lua/Lua.h"
 #include "misc/StringTable.h"
 #include "misc/Unicode.h"
@@ -62,6 +65,18 @@ CApplication::CApplication()
     // The first use of the time manager creates it.
     srand(static_cast<unsigned>(GetTimeManager().GetTime()));
     g_Application = this;
+    // The GUI maps the mouse by where the canvas lies in the window.
+    m_Renderer.SetActiveRectListener([this](const misc::FloatRect& rect, const misc::FloatVector& scale) {
+        m_WidgetManager.SetActiveRect(rect, scale);
+        const misc::IntVector source = m_Renderer.GetSourceResolution();
+        if (source.X > 0 && source.Y > 0)
+            gui::GetGuiServices().canvas = {static_cast<float>(source.X), static_cast<float>(source.Y)};
+    });
+    gui::GuiServices& gui = gui::GetGuiServices();
+    gui.isActive = [this] { return IsActive(); };
+    gui.isFullscreen = [this] { return m_Renderer.IsFullscreen(); };
+    // Windows open and close with declared sounds.
+    gui.playSound = [](const std::string& id) { sound::PlaySound(id.c_str()); };
 
     // The first use of the string table opens the game pack.
     misc::CStringTable::Instance().Load();
@@ -87,6 +102,9 @@ CApplication::CApplication()
     CreateDataFolder(ownFolder);
 
     diag::Log::Instance().SetFile(misc::WideToUtf8(m_AppDataFolder) + "/log.oxlog");
+    // The first use of the audio manager starts the sound output; it pauses with the game.
+    GetAudioManager();
+    m_MediaHooks.audio = [](bool pause) { sound::CAudioManager::Instance().PauseAll(pause); };
     OX_LOG("app", diag::LogInfo, "app created");
     if (ownFolder.empty())
         OX_LOG("data", diag::LogWarning,
@@ -108,6 +126,13 @@ void CApplication::CreateDataFolder(const wstring& ownFolder)
 CApplication::~CApplication()
 {
     DoShutdown();
+    gui::GuiServices& gui = gui::GetGuiServices();
+    if (gui.platform == m_SystemIntegration.get())
+        gui.platform = nullptr;
+    gui.isActive = nullptr;
+    gui.isFullscreen = nullptr;
+    gui.playSound = nullptr;
+    m_Renderer.SetActiveRectListener(nullptr);
     OX_LOG("app", diag::LogInfo, "app destroyed");
     diag::Log::Instance().Flush();
     if (g_Application == this)
@@ -118,6 +143,7 @@ void CApplication::SetSystemIntegration(std::unique_ptr<CSystemIntegration> adap
 {
     m_SystemIntegration = std::move(adapter);
     m_Renderer.SetSystemIntegration(m_SystemIntegration.get());
+    gui::GetGuiServices().platform = m_SystemIntegration.get();
     if (m_SystemIntegration) {
         m_SystemIntegration->SetClient(this);
         m_SystemIntegration->SetIdentity(misc::WideToUtf8(m_Product), misc::WideToUtf8(m_WindowTitle),
@@ -140,10 +166,12 @@ bool CApplication::Init()
         return false;
     }
     CTextureManager::Instance().SetAllOnDemand(allOnDemand);
+    GetAudioManager().SetOnDemand(allOnDemand);
     m_Renderer.AddDeviceResourceOwner(&CTextureManager::Instance());
     graphics::CImage::SetTextureLookup([](const char* id) { return CTextureManager::Instance().GetItem(id); });
     // The display modes can be listed once the platform layer is up.
     m_Renderer.EnumResolutions();
+    gui::RegisterFrameworkWidgets(gui::GetWidgetFactory());
     OX_LOG("app", diag::LogInfo, "app init complete...");
     return true;
 }
@@ -187,9 +215,14 @@ void CApplication::Update()
     m_FrameLimiter.Wait();
     graphics::SetFrameNumber(graphics::GetFrameNumber() + 1);
     lua::CLua::StepGarbageCollector(g_FrameTime);
+    // The widgets see the frame delta of the previous frame; DoUpdate sees the new one.
+    m_WidgetManager.Update();
     GetTimeManager().Update();
+    GetAudioManager().SetStatistics(m_DebugLevel >= DebugHeavy);
+    GetAudioManager().Update();
     CTextureManager::Instance().UpdatePreload();
     DoUpdate();
+    RefreshCursor();
     if (m_ShutdownRequested)
         DoShutdown();
 }
@@ -205,6 +238,8 @@ void CApplication::Draw()
     if (!m_Renderer.BeginScene())
         return;
     DoDraw(&m_Renderer);
+    if (IsActive())
+        gui::CCursor::Instance().Draw(m_Renderer);
     DrawLetterbox();
     m_Renderer.EndScene();
 }
@@ -228,12 +263,31 @@ void CApplication::DrawLetterbox()
     }
 }
 
-void CApplication::DoDraw(graphics::CRenderer* /*renderer*/) {}
-
-void CApplication::Forward()
+void CApplication::DoDraw(graphics::CRenderer* renderer)
 {
+    if (renderer)
+        m_WidgetManager.Draw(*renderer);
+}
+
+void CApplication::Forward(const SystemEvent& event)
+{
+    // Input reaches the widgets through here alone.
+    if (IsActive())
+        m_WidgetManager.OnWindowMessage(event);
     if (m_SystemIntegration)
         m_SystemIntegration->DefaultProcess();
+}
+
+void CApplication::RefreshCursor()
+{
+    if (!m_SystemIntegration || m_ShutdownDone)
+        return;
+    IntPoint pointer = m_SystemIntegration->GetCursorPos();
+    m_SystemIntegration->ScreenToClient(pointer);
+    const IntRect client = m_SystemIntegration->GetClientRect();
+    if (pointer.X >= client.X && pointer.Y >= client.Y && pointer.X < client.X + client.Width &&
+        pointer.Y < client.Y + client.Height)
+        gui::CCursor::Instance().Refresh();
 }
 
 void CApplication::ProcessEvent()
@@ -275,6 +329,7 @@ void CApplication::ProcessEvent()
         UpdateActivity();
         break;
     case WM_SETCURSOR:
+        gui::CCursor::Instance().Refresh();
         event->result = 1;
         break;
     case WM_DISPLAYCHANGE:
@@ -292,7 +347,7 @@ void CApplication::ProcessEvent()
     default:
         break;
     }
-    Forward();
+    Forward(*event);
 }
 
 bool CApplication::IsReplayKey(const SystemEvent& event) const
@@ -332,6 +387,7 @@ void CApplication::UpdateActivity()
     } else {
         if (m_Renderer.IsFullscreen() && m_State == Loading)
             m_State = LoadingPaused;
+        m_WidgetManager.ReleaseCapture();
         if (m_SystemIntegration) {
             m_SystemIntegration->ClipCursor(nullptr);
             m_SystemIntegration->ShowCursor(true);
@@ -463,6 +519,7 @@ void CApplication::DoShutdown()
         return;
     OX_LOG("app", diag::LogTrace, "shutdown...");
     m_State = ShuttingDown;
+    m_WidgetManager.Clear();
     m_Renderer.ReleaseDevice(false);
     if (m_SystemIntegration)
         m_SystemIntegration->Shutdown();

@@ -8,7 +8,9 @@
 #include "core/SystemIntegration.h"
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
+#include "gui/WidgetManager.h"
 #include "misc/WideChar.h"
+#include "sound/AudioManager.h"
 
 #include <functional>
 #include <memory>
@@ -18,8 +20,8 @@ namespace ox::core {
 enum AppState : uint32_t { Created = 0, Loading = 1, LoadingPaused = 2, Running = 3, ShuttingDown = 4 };
 enum DebugLevel : int { DebugNone = 0, DebugCheats = 1, DebugLight = 2, DebugHeavy = 3 };
 
-// Media that pause while the application is in the background. Audio and video register
-// here as they exist; nothing is registered by the framework itself.
+// Media that pause while the application is in the background. The audio manager is
+// registered by the application; video registers here when it exists.
 struct MediaPauseHooks {
     std::function<void(bool pause)> audio;
     std::function<void(bool pause)> video;
@@ -59,6 +61,12 @@ public:
     CSettings& GetSettings() { return m_Settings; }
     CResourceDeclarations& GetResourceDeclarations() { return m_ResourceDeclarations; }
     graphics::CRenderer* GetRenderer() { return &m_Renderer; }
+    sound::CAudioManager& GetAudioManager() { return sound::CAudioManager::Instance(); }
+    gui::CWidgetManager& GetWidgetManager() { return m_WidgetManager; }
+    // The widget manager's main window; a new one takes over at the next update.
+    void SetMainWindow(gui::BaseWindowPtrT window) { m_WidgetManager.SetMainWindow(std::move(window)); }
+    gui::CBaseWindow* GetMainWindow() const { return m_WidgetManager.GetMainWindow(); }
+    gui::CBaseWindow* GetTopWindow() const { return m_WidgetManager.GetTopWindow(); }
     CSystemIntegration* GetSystemIntegration() const { return m_SystemIntegration.get(); }
     // The application owns the adapter from here on: it goes only after the application,
     // so nothing that can reach the application finds it deleted.
@@ -97,7 +105,9 @@ protected:
     // The desktop's size or depth changed: the renderer notes a mode restore if it differs.
     void OnDisplayChange(const SystemEvent& event);
     // Forward: the widget tree while active, then the platform's default handling.
-    void Forward();
+    void Forward(const SystemEvent& event);
+    // The cursor follows the widgets' wishes while the pointer is over the window.
+    void RefreshCursor();
 
     AppState m_State = Created;
     wstring m_Company = u"Tarnwick Loom";
@@ -110,6 +120,7 @@ protected:
     // Declared before the renderer, which holds it too: the renderer goes first.
     std::unique_ptr<CSystemIntegration> m_SystemIntegration;
     graphics::CRenderer m_Renderer;
+    gui::CWidgetManager m_WidgetManager;
     bool m_Minimized = false;
     bool m_Focused = true;
     bool m_Active = true;

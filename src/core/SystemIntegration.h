@@ -50,6 +50,8 @@ public:
     virtual bool IsCursorVisible() = 0;
     // Confines the mouse to a rectangle of the window's client area; null frees it.
     virtual void ClipCursor(const IntRect* clientRect) = 0;
+    // Keeps the mouse events coming to the window while a button is held outside it.
+    virtual void CaptureMouse(bool /*capture*/) {}
     // Whether a key (a virtual-key code) was held when the current event happened.
     virtual bool IsKeyDown(uint32_t virtualKey) = 0;
     // The platform window the render device draws into (an SDL_Window*); null without one.

@@ -41,6 +41,7 @@ public:
     int GetFrameDelta() const { return m_FrameDelta; }
     void Pause(bool flag);
     bool IsPaused() const { return m_PauseCount != 0; }
+    unsigned GetPauseCount() const { return m_PauseCount; }
     CGroupTimer* GetParent() const { return m_Parent; }
 
 protected:

@@ -5,6 +5,9 @@
 #include "core/TextureDeclarations.h"
 #include "core/TextureManager.h"
 #include "diag/Log.h"
+#include "game/LoadWindow.h"
+#include "gui/Cursor.h"
+#include "gui/GuiBinding.h"
 #include "lua/LuaBinding.h"
 #include "lua/LuaHeap.h"
 #include "lua/mluabind/StdBinding.h"
@@ -17,6 +20,9 @@
 #include "quest/LuaThreadManager.h"
 #include "quest/QuestBinding.h"
 #include "quest/QuestData.h"
+#include "sound/AudioManager.h"
+#include "sound/SoundBinding.h"
+#include "sound/SoundDeclarations.h"
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -66,6 +72,15 @@ void LoadTextures()
     manager.GetTexturesAlpha().Load();
 }
 
+// The sound declarations become the audio manager's sounds; the loader is needed only
+// while they are made.
+void LoadSounds()
+{
+    sound::SoundDeclarationsLoader loader;
+    if (loader.Load())
+        sound::CAudioManager::Instance().LoadDeclarations(loader);
+}
+
 } // namespace
 
 CApp::CApp() = default;
@@ -104,13 +119,18 @@ void CApp::CloseOutput()
     m_OutputRedirected = false;
 }
 
-// The script vocabulary that exists so far: std strings, the Lua host and the file watcher,
-// then the quest tree.
+// The script vocabulary that exists so far: std strings, the Lua host, the file watcher and
+// the audio manager and the GUI's windows and widgets, then the quest tree.
 void CApp::BindScripts()
 {
     m_Lua->BeginBinding();
     m_Lua->Bind(mluabind::BindStdStrings());
-    m_Lua->Bind(mluabind::Namespace("ox").Merge(lua::BindFileWatcher()).Merge(lua::BindLuaClasses()).Merge(lua::BindGroupTimers()));
+    m_Lua->Bind(mluabind::Namespace("ox")
+                    .Merge(sound::BindAudioManager())
+                    .Merge(lua::BindFileWatcher())
+                    .Merge(lua::BindLuaClasses())
+                    .Merge(lua::BindGroupTimers())
+                    .Merge(gui::BindGui()));
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
@@ -165,6 +185,7 @@ bool CApp::Init()
     m_ResourceDeclarations.Load("properties/fonts.xml", nullptr);
     LoadTextures();
     m_Demo->TakeDeclaredTextures();
+    LoadSounds();
     // A font finds its glyph image among the declared textures by its image id.
     core::CFontManager& fonts = core::CFontManager::Instance();
     fonts.SetTextureLookup([](const char* id) -> const graphics::CTexture* {
@@ -180,10 +201,31 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     };
     clips.fonts = [](const char* id) -> const graphics::CFont* { return core::CFontManager::Instance().GetItem(id); };
+    m_ClipAudio = std::make_unique<misc::anim::CClipAudio>(sound::CAudioManager::Instance());
+    clips.sounds = m_ClipAudio.get();
     m_Demo->StartClip();
     gui::CBaseWidget::SetDebugRender(core::ReadBool(settings, "debug_render"));
     m_Demo->LoadPanel(m_Settings.GetChild("gui"), m_Settings.GetChild("GUITemplates"));
     return true;
+}
+
+gui::BaseWindowPtrT CApp::CreateLoadWindow()
+{
+    gui::BaseWindowPtrT window(new CLoadWindow(*this));
+    const core::CSettingsGroup& node = m_Settings.GetChildByAttribute("window", "id", "loading", true);
+    if (&node == &core::CSettingsGroup::Empty())
+        OX_LOG("data", diag::LogWarning, "no <window id=\"loading\"> in the GUI description: the first window is empty");
+    window->Load(node, m_Settings.GetChild("GUITemplates"));
+    return window;
+}
+
+void CApp::OnLoadComplete()
+{
+    gui::CCursor& cursor = gui::CCursor::Instance();
+    cursor.EnableCustomCursors(true);
+    cursor.Refresh();
+    if (m_Lua)
+        lua::CallLuaFunction(m_Lua.get(), "Run");
 }
 
 void CApp::OnStop()
@@ -209,9 +251,10 @@ void CApp::ProcessEvent()
 
 void CApp::DoDraw(graphics::CRenderer* renderer)
 {
-    CApplication::DoDraw(renderer);
+    // The test scene under the windows.
     if (m_Demo)
         m_Demo->Draw(*renderer, m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
+    CApplication::DoDraw(renderer);
     DrawFps(renderer);
 }
 

@@ -6,6 +6,7 @@
 #include "core/platform/StandaloneApplicationSdl.h"
 #include "game/DemoScene.h"
 #include "lua/Lua.h"
+#include "misc/animation/ClipAudio.h"
 
 #include <cstdio>
 #include <memory>
@@ -24,6 +25,12 @@ public:
     void ProcessEvent() override;
     void DoDraw(ox::graphics::CRenderer* renderer) override;
     void DoUpdate() override;
+
+    // The first window, made from the description <window id="loading">: it runs the loading
+    // and then the scripts' Run.
+    ox::gui::BaseWindowPtrT CreateLoadWindow();
+    // Loading is through: custom cursors on, then the script function Run.
+    void OnLoadComplete();
 
     // The working folder at start: the game folder.
     void ReadGameFolder();
@@ -52,6 +59,8 @@ private:
     InitFailure m_InitFailure = InitFailure::None;
     // Drawn until the game's windows exist.
     std::unique_ptr<CDemoScene> m_Demo;
+    // Clip objects' sound points, played through the audio manager.
+    std::unique_ptr<ox::misc::anim::CClipAudio> m_ClipAudio;
     // Serves the fonts' glyph images until the texture manager does.
     bool m_OutputRedirected = false;
 };

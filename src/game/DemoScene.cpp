@@ -1,8 +1,12 @@
 #include "game/DemoScene.h"
 
+#include "core/Application.h"
 #include "core/FontManager.h"
 #include "core/SettingsReaders.h"
 #include "graphics/Font.h"
+#include "diag/Log.h"
+#include "gui/Cursor.h"
+#include "gui/Window.h"
 #include "gui/WidgetFactory.h"
 #include "core/TextureManager.h"
 #include "misc/StringTable.h"
@@ -11,6 +15,7 @@
 #include "quest/ImageObject.h"
 
 #include <cmath>
+#include <cstdio>
 
 namespace k17 {
 
@@ -41,8 +46,10 @@ std::vector<uint32_t> MakeTile()
     return pixels;
 }
 
-// A box of the demo's panel: a filled rectangle (`fill`, "#a r g b") with an outline and an
-// optional caption in the small font. Its colour stays white, so its children keep theirs.
+// A box of the demo's panel and window: a filled rectangle (`fill`, "#a r g b") with an
+// outline and an optional caption in the small font. Its colour stays white, so its children
+// keep theirs. With `clickable="true"` a left click on it tells its window "pressed"; with
+// `dialog="<window id>"` the click also opens that window as a modal dialog over its window.
 class CDemoBoxWidget : public gui::CWidget {
 public:
     void Load(const core::CSettingsGroup& node, const core::CSettingsGroup& templates) override
@@ -50,12 +57,16 @@ public:
         CWidget::Load(node, templates);
         core::ReadColor(node, "fill", m_Fill);
         m_Caption = core::ReadLocalText(node, "caption");
+        core::ReadBool(node, "clickable", m_Clickable);
+        m_Dialog = node.GetValue("dialog");
+        if (m_Clickable)
+            SetBroadcastMask(GetBroadcastMask() | gui::BroadcastOnMouseUp);
     }
 
     void DoDraw(graphics::CRenderer& r) override
     {
         const FloatRect rect(0, 0, GetSize().X, GetSize().Y);
-        r.RenderFilledPoly4(misc::RectToPoly4(rect), m_Fill);
+        r.RenderFilledPoly4(misc::RectToPoly4(rect), m_Pressed ? Color(0xFFFFF0A0u) : m_Fill);
         r.RenderRect(rect, Color(0x80FFFFFFu));
         const graphics::CFont* font = core::CFontManager::Instance().GetItem("small");
         if (font && !m_Caption.empty())
@@ -64,9 +75,69 @@ public:
         CWidget::DoDraw(r);
     }
 
+    bool OnMouseMove(const misc::IntVector& pos, int keys, bool broadcast) override
+    {
+        if (!m_Clickable || broadcast)
+            return CWidget::OnMouseMove(pos, keys, broadcast);
+        gui::CCursor::Instance().SetCursor(gui::CCursor::CursorHand);
+        return true;
+    }
+
+    bool OnMouseDown(const misc::IntVector& pos, gui::MouseButtons button, int keys, bool broadcast) override
+    {
+        if (!m_Clickable || broadcast || button != gui::LeftButton)
+            return CWidget::OnMouseDown(pos, button, keys, broadcast);
+        m_Pressed = true;
+        return true;
+    }
+
+    // Released over the box after a press on it: a click. Released anywhere (the broadcast
+    // pass): the press is over.
+    bool OnMouseUp(const misc::IntVector& pos, gui::MouseButtons button, int keys, bool broadcast) override
+    {
+        if (!m_Clickable || button != gui::LeftButton)
+            return CWidget::OnMouseUp(pos, button, keys, broadcast);
+        const bool click = m_Pressed && !broadcast;
+        m_Pressed = false;
+        if (click)
+            Click();
+        return click;
+    }
+
 private:
+    void Click()
+    {
+        gui::WidgetPtrT self(this);
+        OnChildAction("pressed", this);
+        if (!m_Dialog.empty() && GetParentWidget())
+            OpenDialog();
+    }
+
+    void OpenDialog()
+    {
+        gui::CBaseWidget* top = this;
+        while (auto* widget = dynamic_cast<gui::CWidget*>(top))
+            top = widget->GetParentWidget();
+        auto* window = dynamic_cast<gui::CBaseWindow*>(top);
+        const core::CSettings& settings = core::g_Application->GetSettings();
+        const core::CSettingsGroup& node = settings.GetChildByAttribute("window", "id", m_Dialog, true);
+        if (!window || &node == &core::CSettingsGroup::Empty()) {
+            OX_LOG("data", diag::LogWarning, "demo: no window \"%s\" to open", m_Dialog.c_str());
+            return;
+        }
+        gui::WindowPtrT dialog(new gui::CWindow());
+        dialog->Load(node, settings.GetChild("GUITemplates"));
+        dialog->UpdateLayout();
+        const int result = window->DoModal(dialog);
+        std::printf("Lantern Demo: the dialog %s closed with %d\n", m_Dialog.c_str(), result);
+        std::fflush(stdout);
+    }
+
     Color m_Fill {0xFF808080u};
     wstring m_Caption;
+    bool m_Clickable = false;
+    bool m_Pressed = false;
+    std::string m_Dialog;
 };
 
 } // namespace

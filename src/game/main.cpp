@@ -12,7 +12,10 @@ int main(int /*argc*/, char** /*argv*/)
         k17::CApp app;
         app.ReadGameFolder();
         if (app.Init()) {
+            ox::gui::BaseWindowPtrT loading = app.CreateLoadWindow();
+            app.SetMainWindow(loading);
             app.Run();
+            loading.reset();
         } else if (app.GetInitFailure() == k17::CApp::InitFailure::Platform) {
             result = 1;
         }

@@ -159,6 +159,15 @@ void CRenderer::CalculateAspect()
         m_AspectK = {dw / static_cast<float>(sw), dh / static_cast<float>(sh)};
     }
     m_State.SetAspectMatrix(m_AspectK, m_AspectOffset);
+    if (m_ActiveRectListener)
+        m_ActiveRectListener(GetActiveRect(), m_AspectK);
+}
+
+void CRenderer::SetActiveRectListener(ActiveRectListener listener)
+{
+    m_ActiveRectListener = std::move(listener);
+    if (m_ActiveRectListener)
+        m_ActiveRectListener(GetActiveRect(), m_AspectK);
 }
 
 misc::FloatRect CRenderer::GetActiveRect() const

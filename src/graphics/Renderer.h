@@ -12,6 +12,7 @@
 #include "misc/Vector.h"
 #include "misc/WideChar.h"
 
+#include <functional>
 #include <memory>
 #include <optional>
 #include <vector>
@@ -111,6 +112,10 @@ public:
     misc::FloatVector GetScale() const { return m_AspectK; }
     misc::FloatVector GetAspectOffset() const { return m_AspectOffset; }
     misc::FloatRect GetActiveRect() const;
+    // Told the active rectangle and the scale now and whenever they change: whoever maps
+    // window pixels back to the canvas (the GUI) follows it.
+    using ActiveRectListener = std::function<void(const misc::FloatRect& rect, const misc::FloatVector& scale)>;
+    void SetActiveRectListener(ActiveRectListener listener);
 
     void GetAvailableResolutions(ResolutionsT& out) const { out = m_Resolutions; }
     void SetAvailableResolutions(ResolutionsT resolutions) { m_Resolutions = std::move(resolutions); }
@@ -228,6 +233,7 @@ private:
     int m_SourceHeight = 0;
     misc::FloatVector m_AspectK {1.0f, 1.0f};
     misc::FloatVector m_AspectOffset {0.0f, 0.0f};
+    ActiveRectListener m_ActiveRectListener;
     bool m_RestorePending = false;
     bool m_RestoreBpp32 = true;
 };

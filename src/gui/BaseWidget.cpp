@@ -113,6 +113,7 @@ void CBaseWidget::AddWidget(WidgetPtrT widget)
     CWidget* added = widget.get();
     m_ChildWidgets.insert(place, std::move(widget));
     added->SetParentWidget(this);
+    OnChildrenMaskChanged();
 }
 
 bool CBaseWidget::RemoveWidget(CWidget* widget)
@@ -132,6 +133,7 @@ void CBaseWidget::RemoveAllWidgets()
         if (m_LayoutBox && child->GetLayoutBox())
             m_LayoutBox->RemoveBox(child->GetLayoutBox().get());
     }
+    OnChildrenMaskChanged();
 }
 
 CWidget* CBaseWidget::GetWidget(std::string_view id, bool recursive) const
@@ -191,8 +193,21 @@ misc::Poly4 CBaseWidget::GetPoly() const
 IntVector CBaseWidget::AdaptPos(const IntVector& pos) const
 {
     const FloatVector moved(static_cast<float>(pos.X) - m_Offset.X, static_cast<float>(pos.Y) - m_Offset.Y);
-    const FloatVector local = misc::MatrixInverse(m_Rotation).Transform(moved);
+    const FloatVector local = m_Rotated ? misc::MatrixInverse(m_Rotation).Transform(moved) : moved;
     return {static_cast<int>(std::lround(local.X)), static_cast<int>(std::lround(local.Y))};
+}
+
+bool CBaseWidget::ContainsPoint(const FloatVector& point) const
+{
+    // An upright widget's polygon lies within its rectangle: most widgets a point misses
+    // are told by four comparisons.
+    if (!m_Rotated) {
+        const float left = std::min(m_Offset.X, m_Offset.X + m_Size.X), right = std::max(m_Offset.X, m_Offset.X + m_Size.X);
+        const float top = std::min(m_Offset.Y, m_Offset.Y + m_Size.Y), bottom = std::max(m_Offset.Y, m_Offset.Y + m_Size.Y);
+        if (point.X < left || point.X > right || point.Y < top || point.Y > bottom)
+            return false;
+    }
+    return misc::IsInside(GetPoly(), point);
 }
 
 void CBaseWidget::UpdateLayout()
@@ -242,6 +257,7 @@ void CBaseWidget::PurgeDeadChildren()
         if (m_LayoutBox && child->GetLayoutBox())
             m_LayoutBox->RemoveBox(child->GetLayoutBox().get());
     }
+    OnChildrenMaskChanged();
 }
 
 void CBaseWidget::UpdateEffects()
@@ -319,7 +335,7 @@ bool CBaseWidget::DispatchPointer(uint32_t bit, const IntVector& pos, bool broad
         if (!TakesInput(*child))
             continue;
         if (!broadcast) {
-            if (!misc::IsInside(child->GetPoly(), point))
+            if (!child->ContainsPoint(point))
                 continue;
             if (call(*child, child->AdaptPos(pos), false, false))
                 return true;

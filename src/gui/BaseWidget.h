@@ -83,13 +83,19 @@ public:
     // Stores the size; the layout box shares it out; the children follow their anchors.
     virtual void SetSize(float width, float height);
     virtual FloatVector GetPreferredSize() const { return {}; }
-    virtual void SetRotation(const misc::FloatMatrix& rotation) { m_Rotation = rotation; }
+    virtual void SetRotation(const misc::FloatMatrix& rotation)
+    {
+        m_Rotation = rotation;
+        m_Rotated = !(rotation == misc::FloatMatrix::Identity());
+    }
     virtual void SetColor(const graphics::Color& color) { m_Color = color; }
     virtual void SetChildFocused(CWidget* /*child*/) {}
     // What a control tells its parent ("pressed", "selected", ...).
     virtual void OnChildAction(const std::string& /*action*/, CWidget* /*sender*/) {}
     virtual void OnChildLayerChanged(CWidget* child);
     virtual void OnHiddenChanged(bool /*hidden*/) {}
+    // The broadcast masks below this widget changed (a child came or went, a mask was set).
+    virtual void OnChildrenMaskChanged() {}
     virtual void OnDisabledChanged(bool /*disabled*/) {}
 
     // Input. Positions are in this widget's own coordinates; `broadcast` false is the
@@ -155,6 +161,8 @@ public:
     misc::Poly4 GetPoly() const;
     // A point from the parent's coordinates into this widget's own, to whole pixels.
     IntVector AdaptPos(const IntVector& pos) const;
+    // Whether a point in the parent's coordinates lies inside the widget's polygon.
+    bool ContainsPoint(const FloatVector& point) const;
 
     // The layout box of a loaded widget (null for one built by code).
     const LayoutBoxPtrT& GetLayoutBox() const { return m_LayoutBox; }
@@ -181,6 +189,7 @@ private:
     FloatVector m_Offset;
     FloatVector m_Size;
     misc::FloatMatrix m_Rotation;
+    bool m_Rotated = false; // the rotation is not the identity
     graphics::Color m_Color;
     uint32_t m_Flags = 0;
     misc::FloatInsets m_Insets;

@@ -66,4 +66,13 @@ bool ReadChecked(const core::CSettingsGroup& node, const char* name, int& value,
     return ReadNumber(node, name, value, min, max, core::ParseSettingsInt);
 }
 
+void ReadInsets(const core::CSettingsGroup& group, misc::FloatInsets& insets)
+{
+    insets = {};
+    ReadChecked(group, "left", insets.Left, 0, kMaxDescriptionSize);
+    ReadChecked(group, "right", insets.Right, 0, kMaxDescriptionSize);
+    ReadChecked(group, "top", insets.Top, 0, kMaxDescriptionSize);
+    ReadChecked(group, "bottom", insets.Bottom, 0, kMaxDescriptionSize);
+}
+
 } // namespace ox::gui

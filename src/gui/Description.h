@@ -2,6 +2,7 @@
 // Checked reading of GUI descriptions: a value a game maker got wrong is logged on channel
 // "gui" with the element it stands in, and the widget or box takes a sane value instead.
 #include "core/Settings.h"
+#include "misc/Insets.h"
 
 #include <string>
 
@@ -17,6 +18,9 @@ std::string DescribeElement(const core::CSettingsGroup& node);
 // ignored (false); one outside [min, max] is logged and clamped.
 bool ReadChecked(const core::CSettingsGroup& node, const char* name, float& value, float min, float max);
 bool ReadChecked(const core::CSettingsGroup& node, const char* name, int& value, int min, int max);
+
+// Reads `left`, `right`, `top` and `bottom` (each checked as a size); absent ones are 0.
+void ReadInsets(const core::CSettingsGroup& group, misc::FloatInsets& insets);
 
 // Logs a line about the element on channel "gui".
 void ReportElement(const core::CSettingsGroup& node, const char* what, const std::string& detail = {});

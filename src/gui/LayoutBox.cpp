@@ -48,15 +48,6 @@ void ReadWord(const core::CSettingsGroup& node, const char* name, const std::arr
     ReportElement(node, "unknown value, ignored: ", std::string(name) + "=\"" + text + "\"");
 }
 
-void ReadInsets(const core::CSettingsGroup& group, misc::FloatInsets& insets)
-{
-    insets = {};
-    ReadChecked(group, "left", insets.Left, 0, kMaxDescriptionSize);
-    ReadChecked(group, "right", insets.Right, 0, kMaxDescriptionSize);
-    ReadChecked(group, "top", insets.Top, 0, kMaxDescriptionSize);
-    ReadChecked(group, "bottom", insets.Bottom, 0, kMaxDescriptionSize);
-}
-
 bool IsBoxElement(std::string_view name) { return name == "hbox" || name == "vbox" || name == "spacer"; }
 
 // The share of the alignment or packing that moves a child: none at the start, half in the

@@ -79,10 +79,31 @@ void CWidget::SetLayer(uint32_t layer)
 
 uint32_t CWidget::GetChildrenBroadcastMask() const
 {
+    if (m_ChildrenMaskKnown)
+        return m_ChildrenMask;
     uint32_t mask = m_BroadcastMask;
     for (const WidgetPtrT& child : GetWidgets())
         mask |= child->GetChildrenBroadcastMask();
+    m_ChildrenMask = mask;
+    m_ChildrenMaskKnown = true;
     return mask;
+}
+
+void CWidget::SetBroadcastMask(uint32_t mask)
+{
+    m_BroadcastMask = mask;
+    OnChildrenMaskChanged();
+}
+
+void CWidget::OnChildrenMaskChanged()
+{
+    // A parent knows its mask only while its children know theirs: the walk up ends at the
+    // first widget that doesn't know.
+    if (!m_ChildrenMaskKnown)
+        return;
+    m_ChildrenMaskKnown = false;
+    if (m_ParentWidget)
+        m_ParentWidget->OnChildrenMaskChanged();
 }
 
 void CWidget::LayInFront(const CWidget& other)

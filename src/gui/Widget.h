@@ -33,9 +33,11 @@ public:
     uint32_t GetAnchors() const { return m_Anchors; }
     void SetAnchors(uint32_t anchors) { m_Anchors = anchors; }
     uint32_t GetBroadcastMask() const { return m_BroadcastMask; }
-    void SetBroadcastMask(uint32_t mask) { m_BroadcastMask = mask; }
-    // This widget's mask and those of all below it, walked on each call.
+    void SetBroadcastMask(uint32_t mask);
+    // This widget's mask and those of all below it; kept until a mask or a child changes.
     uint32_t GetChildrenBroadcastMask() const;
+    // Forgets the kept masks here and above.
+    void OnChildrenMaskChanged() override;
     bool IsFocused() const { return m_Focused; }
     // Moves this widget directly in front of a sibling.
     void LayInFront(const CWidget& other);
@@ -44,6 +46,8 @@ private:
     CBaseWidget* m_ParentWidget = nullptr;
     uint32_t m_Layer;
     uint32_t m_BroadcastMask;
+    mutable uint32_t m_ChildrenMask = 0;
+    mutable bool m_ChildrenMaskKnown = false;
     uint32_t m_Anchors = AnchorLeft | AnchorTop;
     bool m_Focused = false;
 };

@@ -18,6 +18,9 @@ public:
     // A later registration of a name replaces the earlier one.
     void RegisterWidget(std::string_view name, CreatorT creator);
     bool IsRegistered(std::string_view name) const;
+    // The creator of a kind, or an empty one.
+    CreatorT GetCreator(std::string_view name) const;
+    void UnregisterWidget(std::string_view name);
     // A new widget of the kind, or null for an unknown name.
     WidgetPtrT Create(std::string_view name) const;
     // The same, loaded from `node`.
@@ -40,5 +43,9 @@ private:
 
 // The factory the descriptions are built with, for the whole run.
 CWidgetFactory& GetWidgetFactory();
+
+// Registers the framework's widget kinds in their order. Kinds whose classes don't exist yet
+// are not registered: a description naming one logs a line and skips it.
+void RegisterFrameworkWidgets(CWidgetFactory& factory);
 
 } // namespace ox::gui

@@ -349,4 +349,13 @@ void ReportBadResult(mluabind::CHost& host)
 
 } // namespace detail
 
+bool HasLuaFunction(mluabind::CHost& host, const char* name)
+{
+    lua_State* L = host.GetLuaState();
+    if (!lua_checkstack(L, 3) || !detail::FindLuaFunction(host, L, name))
+        return false;
+    lua_pop(L, 1);
+    return true;
+}
+
 } // namespace ox::lua

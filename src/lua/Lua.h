@@ -145,4 +145,27 @@ R CallLuaFunction(mluabind::CHost& host, const char* name, const Args&... args)
     return CallLuaFunction<R>(&host, name, args...);
 }
 
+// Whether a dotted name gives a value in the host, found as CallLuaFunction finds functions.
+// Nothing is called and nothing is reported.
+bool HasLuaFunction(mluabind::CHost& host, const char* name);
+
+// Calls as CallLuaFunction does and gives the truth of the result as Lua sees it: nil and
+// false are false, so a function that returns nothing says false. A failure is reported
+// and gives false.
+template <class... Args>
+bool CallLuaPredicate(mluabind::CHost& host, const char* name, const Args&... args)
+{
+    static_assert(sizeof...(Args) <= 10, "at most ten arguments");
+    lua_State* L = host.GetLuaState();
+    constexpr int arguments = static_cast<int>(sizeof...(Args));
+    if (!detail::BeginCall(host, L, name, arguments))
+        return false;
+    (detail::PushArgument(host, L, args), ...);
+    if (!detail::FinishCall(host, L, arguments, 1))
+        return false;
+    const bool result = lua_toboolean(L, -1) != 0;
+    lua_pop(L, 1);
+    return result;
+}
+
 } // namespace ox::lua

@@ -123,6 +123,19 @@ TEST_F(AppFixture, ActivityAndMediaPausing)
     EXPECT_EQ(platform->stops, 1);
 }
 
+TEST_F(AppFixture, TheAudioPausesWithTheApplicationByDefault)
+{
+    ox::sound::CAudioManager& audio = app->GetAudioManager();
+    EXPECT_FALSE(audio.IsPaused());
+    Send(WM_ACTIVATEAPP, 0);
+    EXPECT_TRUE(audio.IsPaused());
+    Send(WM_SIZE, SIZE_MINIMIZED);
+    Send(WM_ACTIVATEAPP, 1);
+    EXPECT_TRUE(audio.IsPaused());
+    Send(WM_SIZE, SIZE_RESTORED);
+    EXPECT_FALSE(audio.IsPaused());
+}
+
 TEST_F(AppFixture, FrameLimiterAndShutdown)
 {
     app->LimitFPS(50);

@@ -205,3 +205,35 @@ TEST(SdlAdapter, SecondInstanceIsRefusedAndNotifiesTheFirst)
     first.Shutdown();
     first.Shutdown();
 }
+
+TEST(SdlAdapter, NestedLoopsEndByStopNestedAndTheMainLoopByStopAlone)
+{
+    struct LoopClient : IPlatformClient {
+        CStandaloneApplicationSdl* adapter = nullptr;
+        int frames = 0;
+        int nestedReturnedAt = 0;
+        void ProcessEvent() override {}
+        void Draw() override {}
+        void Update() override
+        {
+            ++frames;
+            if (frames == 1) {
+                adapter->StopNested(); // no nested loop runs: the main loop goes on
+            } else if (frames == 2) {
+                adapter->RunNested();
+                nestedReturnedAt = frames;
+            } else if (frames == 4) {
+                adapter->StopNested();
+            } else if (frames == 6) {
+                adapter->Stop();
+            }
+        }
+    };
+    CStandaloneApplicationSdl adapter(false);
+    LoopClient client;
+    client.adapter = &adapter;
+    adapter.SetClient(&client);
+    adapter.Run();
+    EXPECT_EQ(client.nestedReturnedAt, 4);
+    EXPECT_EQ(client.frames, 6);
+}

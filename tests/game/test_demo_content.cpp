@@ -22,3 +22,17 @@ TEST(DemoContent, TexturesAndDumpsRegenerateByteForByte)
             << file << " differs from what games/demo/make-textures.sh makes";
     }
 }
+
+TEST(DemoContent, SoundsAndTheirDumpRegenerateByteForByte)
+{
+    oxtest::TempDir out;
+    const std::string command = std::string("sh '") + OX_DEMO_GAME + "/make-sounds.sh' '" + OX_TOOLS_DIR + "' '" +
+                                out.Path().string() + "' >'" + (out / "log.txt").string() + "' 2>&1";
+    ASSERT_EQ(WEXITSTATUS(system(command.c_str())), 0) << oxtest::ReadFile(out / "log.txt");
+    for (const char* file : {"sounds/music.ogg", "sounds/click.ogg", "sounds/window_open.ogg", "sounds/found.ogg",
+                             "properties/sounds.bindump"}) {
+        ASSERT_TRUE(fs::exists(out / file)) << file;
+        EXPECT_TRUE(oxtest::ReadFile(out / file) == oxtest::ReadFile(fs::path(OX_DEMO_GAME) / file))
+            << file << " differs from what games/demo/make-sounds.sh makes";
+    }
+}

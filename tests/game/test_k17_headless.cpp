@@ -159,6 +159,10 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_NE(log.find("[anim][1]: Clips loaded"), std::string::npos) << log;
     EXPECT_EQ(log.find("[anim][3]"), std::string::npos) << "the demo's clip loads whole:\n" << log;
     EXPECT_EQ(log.find("[anim][2]"), std::string::npos) << log;
+    // The sounds are declared and the music plays (on OpenAL's null output), without a problem.
+    EXPECT_NE(run.Output().find("Lantern Demo Run: music plays"), std::string::npos) << run.Output();
+    EXPECT_EQ(log.find("[sound][2]"), std::string::npos) << log;
+    EXPECT_EQ(log.find("[sound][3]"), std::string::npos) << log;
     EXPECT_TRUE(fs::exists(run.game / "k17_stdout.txt"));
     EXPECT_TRUE(fs::exists(run.game / "k17_stderr.txt"));
 }

@@ -88,6 +88,15 @@ bool FakePlatform::Init()
     return initResult;
 }
 
+void FakePlatform::RunNested()
+{
+    ++nestedRuns;
+    m_StopNested = false;
+    for (int frame = 0; nestedFrame && frame < 1000 && !m_StopNested; ++frame)
+        nestedFrame();
+    m_StopNested = false;
+}
+
 bool FakePlatform::SetScreenMode(bool full, bool bpp32, unsigned width, unsigned height)
 {
     modes.push_back({full, bpp32, width, height});

@@ -45,6 +45,12 @@ public:
     bool cursorVisible = true;
     std::optional<IntRect> cursorClip;
     std::string product, windowTitle, lockFolder;
+    bool mouseCaptured = false;
+    int captures = 0;   // CaptureMouse(true) calls
+    // A nested loop (a modal window) runs this once a frame until StopNested, at most 1000
+    // times; without it RunNested returns at once.
+    std::function<void()> nestedFrame;
+    int nestedRuns = 0;
     // Called from the destructor, with the fake still whole.
     std::function<void(const FakePlatform&)> onDestroyed;
 
@@ -73,8 +79,8 @@ public:
     void Stop() override { ++stops; }
     void Shutdown() override { ++shutdowns; }
     bool CheckSingleInstance() override { return singleInstance; }
-    void RunNested() override {}
-    void StopNested() override {}
+    void RunNested() override;
+    void StopNested() override { m_StopNested = true; }
     bool SetScreenMode(bool fullscreen, bool bpp32, unsigned width, unsigned height) override;
     bool GetDesktopResolution(unsigned* width, unsigned* height) override;
     SystemEvent* GetCurrentEvent() override { return &m_Event; }
@@ -91,6 +97,11 @@ public:
     void ShowCursor(bool show) override { cursorVisible = show; }
     bool IsCursorVisible() override { return cursorVisible; }
     void ClipCursor(const IntRect* clientRect) override;
+    void CaptureMouse(bool capture) override
+    {
+        mouseCaptured = capture;
+        captures += capture ? 1 : 0;
+    }
     bool IsKeyDown(uint32_t virtualKey) override;
     void* GetWindowHandle() override { return windowHandle; }
     void SetClient(ox::core::IPlatformClient* client) override { m_Client = client; }
@@ -100,6 +111,7 @@ public:
 private:
     ox::core::IPlatformClient* m_Client = nullptr;
     SystemEvent m_Event;
+    bool m_StopNested = false;
 };
 
 // Input in client (window) pixels, as a player's would arrive through the platform.

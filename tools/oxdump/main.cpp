@@ -13,6 +13,7 @@
 #include "misc/GamePack.h"
 #include "misc/StringTable.h"
 #include "misc/Unicode.h"
+#include "sound/SoundDeclarations.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -37,6 +38,7 @@ const char* kUsage =
     "                                                    build the alpha-mask table\n"
     "       oxdump clips <clips.xml|folder> <out>        compile the clips\n"
     "       oxdump quest <quest.xml> <quest.bindump>    compile the quest\n"
+    "       oxdump sounds <sounds.xml> <out>             compile the sound declarations\n"
     "       oxdump show <file.bindump>                   print the records of a dump\n"
     "       oxdump COMMAND --help                        details of one command\n";
 
@@ -68,13 +70,24 @@ const char* kTexturesAlphaHelp =
     "the list; empty lines and lines starting with # are skipped. --order picks the scan\n"
     "order; auto (default) takes whichever gives fewer runs.\n";
 
+const char* kSoundsHelp =
+    "usage: oxdump sounds <sounds.xml> <out>\n"
+    "\n"
+    "Compiles the sound declarations into properties/sounds.bindump: one 352-byte record\n"
+    "per <sound> (id, file, group_template, balance, volume, priority, repeat,\n"
+    "max_concurrent_sound_play, concurrent_sound_play_delay, speed), in the order of the\n"
+    "document, each with the load_on_demand flag of its innermost <sound_group>. Paths\n"
+    "become lower case with forward slashes. Problems of single sounds are shown; the\n"
+    "files the sounds name are not checked (the game leaves out a sound whose file is\n"
+    "missing, and says so).\n";
+
 const char* kShowHelp =
     "usage: oxdump show <file.bindump>\n"
     "\n"
     "Checks a binary dump as the game would and prints its records: texture declarations\n"
-    "(resources.bindump), alpha masks (texturesalpha.bindump), clips (clips.bindump), quests\n"
-    "(quest.bindump) and\n"
-    "string tables (strings.bindump, strings.xml.bin_utf16le, strings.xml.bin_utf32le).\n";
+    "(resources.bindump), alpha masks (texturesalpha.bindump), clips (clips.bindump), sound\n"
+    "declarations (sounds.bindump), quests (quest.bindump) and string tables (strings.bindump,\n"
+    "strings.xml.bin_utf16le, strings.xml.bin_utf32le).\n";
 
 int UsageError(const std::string& message, const char* usage = kUsage)
 {
@@ -241,6 +254,43 @@ int TexturesAlpha(int argc, char** argv)
     return 0;
 }
 
+int Sounds(int argc, char** argv)
+{
+    if (argc != 4)
+        return UsageError("sounds needs <sounds.xml> <out>", kSoundsHelp);
+    std::string xml;
+    if (!ox::misc::sys::ReadWholeFile(argv[2], xml)) {
+        fprintf(stderr, "oxdump: cannot read %s\n", argv[2]);
+        return 1;
+    }
+    std::vector<uint8_t> block;
+    if (!ox::sound::SoundDeclarationsLoader::ConvertXml(xml.data(), xml.size(), argv[2], block)) {
+        fprintf(stderr, "oxdump: %s is not valid\n", argv[2]);
+        return 1;
+    }
+    if (!ox::misc::sys::WriteFileAtomically(argv[3], block.data(), block.size())) {
+        fprintf(stderr, "oxdump: cannot write %s\n", argv[3]);
+        return 1;
+    }
+    printf("%s: %zu sounds, %zu bytes\n", argv[3], (block.size() - 8) / sizeof(ox::sound::SoundRecord),
+           block.size());
+    return 0;
+}
+
+void ShowSounds(const uint8_t* data)
+{
+    const auto* header = reinterpret_cast<const ox::sound::SoundDeclarationsHeader*>(data);
+    const auto* records = reinterpret_cast<const ox::sound::SoundRecord*>(header + 1);
+    printf("sound declarations: %u sounds\n", header->count);
+    for (uint32_t i = 0; i < header->count; ++i) {
+        const ox::sound::SoundRecord& r = records[i];
+        printf("sound %s file %s group %s balance %g volume %g priority %d repeat %d max %d delay %g speed %g "
+               "flags %u\n",
+               r.id.c_str(), r.file.c_str(), r.group_template.c_str(), r.balance, r.volume, r.priority, r.repeat,
+               r.max_concurrent_sound_play, r.concurrent_sound_play_delay, r.speed, r.flags);
+    }
+}
+
 const char* AnimName(uint32_t type)
 {
     static const char* names[] = {"none", "once", "loop", "pingpong", "backward loop", "backward pingpong"};
@@ -389,6 +439,9 @@ int Show(int argc, char** argv)
             ShowStrings16(data, table.GetCount());
     } else if (memcmp(data, "S32L", 4) == 0) {
         ok = ShowStrings32(data, size, path.c_str());
+    } else if (memcmp(data, "SNDS", 4) == 0) {
+        if ((ok = ox::sound::SoundDeclarationsLoader::Check(data, size, path.c_str())))
+            ShowSounds(data);
     } else {
         fprintf(stderr, "oxdump: %s: unknown kind of dump (first word 0x%08X)\n", path.c_str(), magic);
         return 1;
@@ -428,6 +481,7 @@ int main(int argc, char** argv)
         {"resources", Resources, kResourcesHelp},
         {"texturesalpha", TexturesAlpha, kTexturesAlphaHelp},
         {"clips", oxdump::Clips, oxdump::kClipsHelp},
+        {"sounds", Sounds, kSoundsHelp},
         {"quest", oxdump::Quest, oxdump::kQuestHelp},
         {"show", Show, kShowHelp},
     };

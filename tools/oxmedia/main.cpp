@@ -1,6 +1,6 @@
-// oxmedia: image content for the game. Generates test images, converts images to the PVR
-// containers, builds the alpha-mask table, and describes media files, all with the code
-// the game reads them with.
+// oxmedia: image and sound content for the game. Generates test images and Ogg Vorbis
+// tones, converts images to the PVR containers, builds the alpha-mask table, and describes
+// media files, all with the code the game reads them with.
 #include "core/TexturesAlpha.h"
 #include "core/TexturesAlphaWriter.h"
 #include "common/LogToStderr.h"
@@ -9,6 +9,8 @@
 #include "misc/imagelib/ImageLib.h"
 #include "misc/imagelib/MediaWriter.h"
 #include "misc/imagelib/PvrContainer.h"
+#include "sound/OggVorbisStream.h"
+#include "sound/VorbisWriter.h"
 
 #include <cstdio>
 #include <cstring>
@@ -31,7 +33,8 @@ const char* kUsage =
     "                                                       convert a PNG or JPEG to a container\n"
     "       oxmedia alpha <out.bindump> [--order O] [ID=]IMAGE...\n"
     "                                                       build the alpha-mask table\n"
-    "       oxmedia info FILE...                            describe images, containers, tables\n"
+    "       oxmedia ogg <out.ogg> [options]                 write tones as Ogg Vorbis\n"
+    "       oxmedia info FILE...                            describe images, containers, tables, sounds\n"
     "       oxmedia COMMAND --help                          details of one command\n";
 
 const char* kPngHelp =
@@ -66,11 +69,22 @@ const char* kAlphaHelp =
     "one answer everywhere take no runs. --order picks the scan order; auto (default)\n"
     "takes whichever gives fewer runs.\n";
 
+const char* kOggHelp =
+    "usage: oxmedia ogg <out.ogg> [--tone HZ[:SECONDS][,HZ[:SECONDS]...]] [--seconds S] [--rate R]\n"
+    "                   [--channels 1|2] [--amplitude A] [--quality Q] [--no-end]\n"
+    "\n"
+    "Writes Ogg Vorbis: sine tones one after another, each faded in and out over 5 ms so\n"
+    "that nothing clicks (a frequency of 0 is a rest). --tone defaults to 440; --seconds,\n"
+    "the length of a tone that gives none, to 1; --rate to 44100; --channels to 2;\n"
+    "--amplitude (of full scale) to 0.5; --quality (-0.1 to 1) to 0.4. --no-end leaves the\n"
+    "last page without its end-of-stream flag, as a cut file has it.\n";
+
 const char* kInfoHelp =
     "usage: oxmedia info FILE...\n"
     "\n"
     "Prints the size of PNG and JPEG images, the size and surface format of .pvr and\n"
-    ".pvrlzo containers, and the masks of an alpha-mask table.\n";
+    ".pvrlzo containers, the masks of an alpha-mask table, and the rate, channels and\n"
+    "length of an Ogg Vorbis file.\n";
 
 int UsageError(const std::string& message, const char* usage = kUsage)
 {
@@ -304,6 +318,82 @@ int Alpha(int argc, char** argv)
     return 0;
 }
 
+struct Tone {
+    double frequency;
+    double seconds;
+};
+
+// "HZ[:SECONDS],..." into tones; false for anything else.
+bool ParseTones(const std::string& text, double seconds, int rate, std::vector<Tone>& tones)
+{
+    std::istringstream list(text);
+    for (std::string item; std::getline(list, item, ',');) {
+        char* end = nullptr;
+        Tone tone {strtod(item.c_str(), &end), seconds};
+        if (*end == ':')
+            tone.seconds = strtod(end + 1, &end);
+        if (*end || !(tone.frequency >= 0 && tone.frequency < rate / 2.0) || !(tone.seconds > 0 && tone.seconds <= 600))
+            return false;
+        tones.push_back(tone);
+    }
+    return !tones.empty();
+}
+
+int Ogg(int argc, char** argv)
+{
+    std::string toneList = "440";
+    double seconds = 1.0, amplitude = 0.5;
+    int rate = 44100, channels = 2;
+    ox::sound::VorbisEncodeOptions options;
+    std::vector<std::string> files;
+    std::string error;
+    bool ok = Options(argc, argv, 2, files, [&](const std::string& arg, const char* value) {
+        if (arg == "--no-end") {
+            options.endOfStream = false;
+            return 0;
+        }
+        if (!value)
+            return -1;
+        if (arg == "--tone")
+            toneList = value;
+        else if (arg == "--seconds")
+            seconds = atof(value);
+        else if (arg == "--rate")
+            rate = atoi(value);
+        else if (arg == "--channels")
+            channels = atoi(value);
+        else if (arg == "--amplitude")
+            amplitude = atof(value);
+        else if (arg == "--quality")
+            options.quality = static_cast<float>(atof(value));
+        else
+            return -1;
+        return 1;
+    }, error);
+    if (!ok)
+        return UsageError(error, kOggHelp);
+    if (files.size() != 1)
+        return UsageError("ogg needs one output file", kOggHelp);
+    std::vector<Tone> tones;
+    if (rate < 8000 || rate > 192000 || channels < 1 || channels > 2 || !(amplitude >= 0 && amplitude <= 1) ||
+        !(options.quality >= -0.1f && options.quality <= 1.0f) || !ParseTones(toneList, seconds, rate, tones))
+        return UsageError("bad tone, rate, channels, amplitude or quality", kOggHelp);
+    std::vector<int16_t> pcm;
+    for (const Tone& tone : tones) {
+        const auto frames = static_cast<size_t>(tone.seconds * rate + 0.5);
+        std::vector<int16_t> part = ox::sound::SynthesiseTone(tone.frequency, frames, channels, rate, amplitude, 5.0);
+        pcm.insert(pcm.end(), part.begin(), part.end());
+    }
+    std::vector<uint8_t> bytes;
+    if (!ox::sound::EncodeVorbis(pcm.data(), pcm.size() / channels, channels, rate, bytes, options))
+        return 1;
+    if (!Write(files[0], bytes))
+        return 1;
+    printf("%s: %zu frames, %d Hz, %d channel(s), %zu bytes\n", files[0].c_str(), pcm.size() / channels, rate,
+           channels, bytes.size());
+    return 0;
+}
+
 int Info(int argc, char** argv)
 {
     if (argc < 3)
@@ -334,6 +424,11 @@ int Info(int argc, char** argv)
             };
             ok = EndsWith(path, ".pvrlzo") ? PvrDecompressLzo(data.data(), data.size(), path.c_str(), show)
                                            : show(data.data(), data.size());
+        } else if (EndsWith(path, ".ogg")) {
+            ox::sound::COggVorbisStream stream;
+            if ((ok = stream.OpenMemory(data.data(), static_cast<unsigned>(data.size()), path.c_str())))
+                printf("%s: Ogg Vorbis, %d Hz, %s, %.3f s\n", path.c_str(), stream.GetRate(),
+                       stream.IsStereo() ? "stereo" : "mono", stream.GetLength());
         } else if (EndsWith(path, ".bindump")) {
             std::vector<uint32_t> aligned((data.size() + 3) / 4);
             memcpy(aligned.data(), data.data(), data.size());
@@ -371,7 +466,7 @@ int main(int argc, char** argv)
         const char* help;
     } commands[] = {
         {"png", Png, kPngHelp}, {"jpeg", Jpeg, kJpegHelp}, {"pvr", Pvr, kPvrHelp},
-        {"alpha", Alpha, kAlphaHelp}, {"info", Info, kInfoHelp},
+        {"alpha", Alpha, kAlphaHelp}, {"ogg", Ogg, kOggHelp}, {"info", Info, kInfoHelp},
     };
     for (const Command& c : commands) {
         if (command != c.name)

@@ -62,9 +62,72 @@ function lantern_start(self)
     print("Lantern Demo: the lamp flickered 3 times on the level clock")
 end
 
+-- Each kind of sound has a volume group of its own (properties/sounds.xml).
+local volumes = { music = 60, clicks = 90, windows = 80, found = 100 }
+
 function Run()
     lantern.lit = lantern.lit + 1
     print("Lantern Demo Run: the lantern is lit (" .. lantern.lit .. ")")
+    local audio = ox.core.CAudioManager.Instance()
+    for group, volume in pairs(volumes) do
+        audio.SetGroupVolume(group, volume)
+    end
+    -- The music loops without end; it starts once, whatever runs this again.
+    if not (lantern.music and audio.IsSound(lantern.music)) then
+        lantern.music = audio.Play("music", -2, -2, -2, -2, -2)
+    end
+    print("Lantern Demo Run: music " .. (lantern.music ~= 0 and "plays" or "is silent") ..
+          (audio.IsAudioAvailable() and "" or " (no audio output)"))
+end
+
+-- The first window's hooks (gui.xml, window "loading"). Each gets the window first. A
+-- mouse or key hook takes the place of the window's own handling: SuperOn... runs that.
+DemoWindow = DemoWindow or {}
+
+function DemoWindow.OnChildAction(self, action, sender)
+    print("DemoWindow: " .. text(action) .. " " .. text(sender.GetId()))
+    return true
+end
+
+function DemoWindow.OnMouseDown(self, x, y, button, keys, broadcast)
+    if not broadcast then
+        print(string.format("DemoWindow: mouse down at %d,%d, button %d", x, y, button))
+        ox.core.CAudioManager.Instance().Play("click", -2, -2, -2, -2, -2)
+    end
+    return self.SuperOnMouseDown(x, y, button, keys, broadcast)
+end
+
+function DemoWindow.OnKeyDown(self, key, keys, raw, broadcast)
+    if key == ox.gui.OX_SPACE then
+        lantern.lit = lantern.lit + 1
+        print("DemoWindow: Space, the lantern is lit (" .. lantern.lit .. ")")
+    elseif key ~= ox.gui.OX_NONE then
+        print("DemoWindow: key " .. key)
+    end
+    return self.SuperOnKeyDown(key, keys, raw, broadcast)
+end
+
+-- The modal dialog's hooks (gui.xml, window "demo_dialog"): OK, Cancel and Escape end it.
+DemoDialog = DemoDialog or {}
+
+function DemoDialog.OnChildAction(self, action, sender)
+    local id = text(sender.GetId())
+    print("DemoDialog: " .. text(action) .. " " .. id)
+    if id == "ok" then
+        self.EndModal(1)
+    elseif id == "cancel" then
+        self.EndModal(0)
+    end
+    return true
+end
+
+function DemoDialog.OnKeyDown(self, key, keys, raw, broadcast)
+    if key == ox.gui.OX_ESC then
+        print("DemoDialog: Escape")
+        self.EndModal(0)
+        return true
+    end
+    return self.SuperOnKeyDown(key, keys, raw, broadcast)
 end
 
 function quest.OnClose()

@@ -98,6 +98,11 @@ bool CStandaloneApplicationSdl::Init()
 {
     if (m_VideoReady)
         return true;
+    // The capture follows the buttons the GUI counts, and nothing else; a double click is
+    // as quick and as near as on the desktop the game was made for.
+    SDL_SetHint(SDL_HINT_MOUSE_AUTO_CAPTURE, "0");
+    SDL_SetHint(SDL_HINT_MOUSE_DOUBLE_CLICK_TIME, "500");
+    SDL_SetHint(SDL_HINT_MOUSE_DOUBLE_CLICK_RADIUS, "2");
     if (SDL_InitSubSystem(SDL_INIT_VIDEO) != 0) {
         fprintf(stderr, "Cannot open a display: %s\n", SDL_GetError());
         fflush(stderr);
@@ -290,6 +295,12 @@ void CStandaloneApplicationSdl::ClipCursor(const IntRect* clientRect)
     SDL_SetWindowMouseRect(m_Wnd, &rect);
 }
 
+void CStandaloneApplicationSdl::CaptureMouse(bool capture)
+{
+    if (m_VideoReady)
+        SDL_CaptureMouse(capture ? SDL_TRUE : SDL_FALSE);
+}
+
 bool CStandaloneApplicationSdl::IsKeyDown(uint32_t virtualKey)
 {
     const uint16_t modifiers = m_EventsIndex > 0 ? m_Modifiers : static_cast<uint16_t>(SDL_GetModState());
@@ -377,24 +388,30 @@ void CStandaloneApplicationSdl::PollNotifications()
 bool CStandaloneApplicationSdl::PumpMessages()
 {
     PollNotifications();
+    // The records of each event are taken out before they are handled: a handler may run a
+    // nested loop (a modal window), which pumps on its own.
+    std::vector<SystemEvent> records;
+    auto dispatchAll = [&] {
+        for (size_t i = 0; i < records.size() && !m_StopRequested; ++i)
+            Dispatch(records[i]);
+        records.clear();
+    };
     if (m_VideoReady) {
         SDL_Event event;
-        while (!m_StopRequested && SDL_PollEvent(&event)) {
-            TranslateSdlEvent(event, CurrentState(event), m_Pending);
-            for (size_t i = 0; i < m_Pending.size() && !m_StopRequested; ++i)
-                Dispatch(m_Pending[i]);
-            m_Pending.clear();
+        // A nested loop told to stop leaves the rest of the events to the loop it returns to.
+        while (!m_StopRequested && !m_StopNestedRequested && SDL_PollEvent(&event)) {
+            TranslateSdlEvent(event, CurrentState(event), records);
+            dispatchAll();
         }
     }
-    for (size_t i = 0; i < m_Pending.size() && !m_StopRequested; ++i)
-        Dispatch(m_Pending[i]);
-    m_Pending.clear();
+    records.swap(m_Pending);
+    dispatchAll();
     return !m_StopRequested;
 }
 
-void CStandaloneApplicationSdl::MainLoop()
+void CStandaloneApplicationSdl::MainLoop(bool nested)
 {
-    while (!m_StopNestedRequested) {
+    while (!(nested && m_StopNestedRequested)) {
         PumpMessages();
         if (m_StopRequested)
             break;
@@ -403,11 +420,23 @@ void CStandaloneApplicationSdl::MainLoop()
             m_Client->Draw();
         }
     }
+}
+
+void CStandaloneApplicationSdl::Run() { MainLoop(false); }
+
+void CStandaloneApplicationSdl::RunNested()
+{
+    ++m_NestedDepth;
+    MainLoop(true);
+    --m_NestedDepth;
     m_StopNestedRequested = false;
 }
 
-void CStandaloneApplicationSdl::Run() { MainLoop(); }
-
-void CStandaloneApplicationSdl::RunNested() { MainLoop(); }
+void CStandaloneApplicationSdl::StopNested()
+{
+    // Only a nested loop ends: the main loop ends by Stop alone.
+    if (m_NestedDepth > 0)
+        m_StopNestedRequested = true;
+}
 
 } // namespace ox::core

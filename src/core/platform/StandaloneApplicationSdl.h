@@ -28,7 +28,7 @@ public:
     void Shutdown() override;
     bool CheckSingleInstance() override;
     void RunNested() override;
-    void StopNested() override { m_StopNestedRequested = true; }
+    void StopNested() override;
     bool SetScreenMode(bool fullscreen, bool bpp32, unsigned width, unsigned height) override;
     bool GetDesktopResolution(unsigned* width, unsigned* height) override;
     SystemEvent* GetCurrentEvent() override { return &m_Event; }
@@ -45,6 +45,7 @@ public:
     void ShowCursor(bool show) override;
     bool IsCursorVisible() override { return m_CursorVisible; }
     void ClipCursor(const IntRect* clientRect) override;
+    void CaptureMouse(bool capture) override;
     bool IsKeyDown(uint32_t virtualKey) override;
 
     SDL_Window* GetWindow() const { return m_Wnd; }
@@ -59,7 +60,8 @@ public:
     bool PumpMessages();
 
 private:
-    void MainLoop();
+    // Runs frames until Stop, or for a nested loop until StopNested.
+    void MainLoop(bool nested);
     void PollNotifications();
     void ApplyCursor();
     TranslationState CurrentState(const SDL_Event& event);
@@ -69,6 +71,7 @@ private:
     bool m_VideoReady = false;
     bool m_StopRequested = false;
     bool m_StopNestedRequested = false;
+    int m_NestedDepth = 0;
     bool m_Resizable;
     bool m_Fullscreen = false;
     unsigned m_CursorType = 0;

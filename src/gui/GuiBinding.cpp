@@ -1,0 +1,259 @@
+#include "gui/GuiBinding.h"
+
+#include "graphics/Renderer.h"
+#include "gui/Cursor.h"
+#include "gui/LuaWidget.h"
+#include "gui/Window.h"
+#include "gui/WidgetManager.h"
+#include "lua/Lua.h"
+#include "lua/mluabind/StdBinding.h"
+
+namespace ox::gui {
+
+using misc::IntVector;
+using mluabind::Adopt;
+using mluabind::Class;
+using mluabind::Constant;
+
+namespace {
+
+struct NamedValue {
+    const char* name;
+    int value;
+};
+
+constexpr NamedValue kKeyCodes[] = {
+    {"OX_NONE", OX_NONE},     {"OX_LEFT", OX_LEFT},     {"OX_RIGHT", OX_RIGHT},   {"OX_UP", OX_UP},
+    {"OX_DOWN", OX_DOWN},     {"OX_HOME", OX_HOME},     {"OX_END", OX_END},       {"OX_PGUP", OX_PGUP},
+    {"OX_PGDOWN", OX_PGDOWN}, {"OX_INSERT", OX_INSERT}, {"OX_DELETE", OX_DELETE}, {"OX_SPACE", OX_SPACE},
+    {"OX_BACK", OX_BACK},     {"OX_RETURN", OX_RETURN}, {"OX_TAB", OX_TAB},       {"OX_ESC", OX_ESC},
+    {"OX_F1", OX_F1},         {"OX_F2", OX_F2},         {"OX_F3", OX_F3},         {"OX_F4", OX_F4},
+    {"OX_F5", OX_F5},         {"OX_F6", OX_F6},         {"OX_F7", OX_F7},         {"OX_F8", OX_F8},
+    {"OX_F9", OX_F9},         {"OX_F10", OX_F10},       {"OX_F11", OX_F11},       {"OX_F12", OX_F12},
+    {"OX_OEM_2", OX_OEM_2},   {"JustifyLeft", -1},      {"JustifyCenterH", 0},    {"JustifyRight", 1},
+    {"JustifyTop", -1},       {"JustifyCenterV", 0},    {"JustifyBottom", 1},
+};
+
+constexpr NamedValue kWidgetConstants[] = {
+    {"FlagHidden", FlagHidden},
+    {"FlagDisabled", FlagDisabled},
+    {"FlagClipDraw", FlagClipDraw},
+    {"FlagDead", FlagDead},
+    {"FlagDrawFloatRect", FlagDrawFloatRect},
+    {"AnchorLeft", AnchorLeft},
+    {"AnchorRight", AnchorRight},
+    {"AnchorTop", AnchorTop},
+    {"AnchorBottom", AnchorBottom},
+    {"LayerTop", LayerTop},
+    {"LayerAlwaysOnTop", -1},
+    {"LeftButton", LeftButton},
+    {"RightButton", RightButton},
+    {"MiddleButton", MiddleButton},
+    {"ShiftPressed", ShiftPressed},
+    {"ControlPressed", ControlPressed},
+    {"AltPressed", AltPressed},
+    {"BroadcastOnChar", BroadcastOnChar},
+    {"BroadcastOnKeyDown", BroadcastOnKeyDown},
+    {"BroadcastOnKeyUp", BroadcastOnKeyUp},
+    {"BroadcastOnMouseMove", BroadcastOnMouseMove},
+    {"BroadcastOnMouseDrag", BroadcastOnMouseDrag},
+    {"BroadcastOnMouseDown", BroadcastOnMouseDown},
+    {"BroadcastOnMouseUp", BroadcastOnMouseUp},
+    {"BroadcastOnDoubleClick", BroadcastOnDoubleClick},
+    {"BroadcastOnMouseWheel", BroadcastOnMouseWheel},
+};
+
+constexpr NamedValue kCursorTypes[] = {
+    {"CursorPointer", CCursor::CursorPointer},     {"CursorHand", CCursor::CursorHand},
+    {"CursorText", CCursor::CursorText},           {"CursorHourglass", CCursor::CursorHourglass},
+    {"CursorCustom", CCursor::CursorCustom},       {"CursorNone", CCursor::CursorNone},
+};
+
+template <class C, size_t N>
+C& WithConstants(C& cls, const NamedValue (&values)[N])
+{
+    for (const NamedValue& v : values)
+        cls.Constant(v.name, v.value);
+    return cls;
+}
+
+mluabind::i::GenericClass& BaseWidgetClass()
+{
+    using W = CBaseWidget;
+    auto& cls = Class<W>("CBaseWidget")
+                    .Method("SetOffset", &W::SetOffset)
+                    .Method("GetAbsPos", &W::GetAbsPos)
+                    .Method("SetSize", &W::SetSize)
+                    .Method("GetPreferredSize", &W::GetPreferredSize)
+                    .Method("SetRotation", &W::SetRotation)
+                    .Method("SetColor", &W::SetColor)
+                    .Method("SetChildFocused", &W::SetChildFocused)
+                    .Method("OnChildAction", &W::OnChildAction)
+                    .Method("OnChar", &W::OnChar)
+                    .Method("OnKeyDown", &W::OnKeyDown)
+                    .Method("OnKeyUp", &W::OnKeyUp)
+                    .Method("OnMouseMove", &W::OnMouseMove)
+                    .Method("OnMouseDown", &W::OnMouseDown)
+                    .Method("OnMouseUp", &W::OnMouseUp)
+                    .Method("OnDoubleClick", &W::OnDoubleClick)
+                    .Method("OnMouseWheel", &W::OnMouseWheel)
+                    .Method("Load", &W::Load)
+                    .Method("DoDraw", &W::DoDraw)
+                    .Method("DoUpdate", &W::DoUpdate)
+                    .Method("Update", &W::Update)
+                    .Method("Draw", &W::Draw)
+                    .Method("AddWidget", &W::AddWidget)
+                    .Method("AddWidget", [](W& w, CWidget* child) { w.AddWidget(WidgetPtrT(child)); }, Adopt(1))
+                    .Method("RemoveWidget", static_cast<bool (W::*)(CWidget*)>(&W::RemoveWidget))
+                    .Method("RemoveWidget", static_cast<bool (W::*)(const WidgetPtrT&)>(&W::RemoveWidget))
+                    .Method("RemoveAllWidgets", &W::RemoveAllWidgets)
+                    .Method("GetWidget", [](W& w, const char* id) { return w.GetWidget(id ? id : ""); })
+                    .Method("GetWidget", [](W& w, const char* id, bool recursive) {
+                        return w.GetWidget(id ? id : "", recursive);
+                    })
+                    .Method("AddEffect", &W::AddEffect)
+                    .Method("RemoveAllEffects", &W::RemoveAllEffects)
+                    .Method("GetFlags", &W::GetFlags)
+                    .Method("SetFlags", &W::SetFlags)
+                    .Method("AddFlags", &W::AddFlags)
+                    .Method("RemFlags", &W::RemFlags)
+                    .Method("GetPoly", &W::GetPoly)
+                    .Method("AdaptPos", &W::AdaptPos)
+                    .Method("UpdateLayout", &W::UpdateLayout)
+                    .Method("UpdateLayoutOffsets", &W::UpdateLayoutOffsets)
+                    .Method("GetId", &W::GetId)
+                    .Method("GetSize", &W::GetSize)
+                    .Method("GetOffset", &W::GetOffset)
+                    .Method("GetInsets", &W::GetInsets)
+                    .Method("SetInsets", &W::SetInsets)
+                    .Method("GetRotation", &W::GetRotation)
+                    .Method("GetColor", &W::GetColor);
+    return WithConstants(cls, kWidgetConstants);
+}
+
+mluabind::i::GenericClass& WidgetClass()
+{
+    using W = CWidget;
+    return Class<W>("CWidget")
+        .BaseClass<CBaseWidget>()
+        .Constructor<>()
+        .Method("SetParentWidget", &W::SetParentWidget)
+        .Method("ClearParentWidget", &W::ClearParentWidget)
+        .Method("SetFocused", &W::SetFocused)
+        .Method("OnParentSizeChanged", &W::OnParentSizeChanged)
+        .Method("GetParentWidget", &W::GetParentWidget)
+        .Method("SetLayer", &W::SetLayer)
+        .Method("GetLayer", &W::GetLayer)
+        .Method("GetAnchors", &W::GetAnchors)
+        .Method("SetAnchors", &W::SetAnchors)
+        .Method("GetBroadcastMask", &W::GetBroadcastMask)
+        .Method("SetBroadcastMask", &W::SetBroadcastMask)
+        .Method("GetChildrenBroadcastMask", &W::GetChildrenBroadcastMask)
+        .Method("IsFocused", &W::IsFocused)
+        .Method("LayInFront", &W::LayInFront);
+}
+
+mluabind::i::GenericClass& BaseWindowClass()
+{
+    using W = CBaseWindow;
+    // A window a script made (and owns) passes into the keeping of the window it goes on.
+    return Class<W>("CBaseWindow")
+        .BaseClass<CBaseWidget>()
+        .Method("DoModal", [](W& w, W* window) { return w.DoModal(BaseWindowPtrT(window)); }, Adopt(1))
+        .Method("EndModal", &W::EndModal)
+        .Method("AddChildWindow", [](W& w, W* window) { w.AddChildWindow(BaseWindowPtrT(window)); }, Adopt(1))
+        .Method("RemoveChildWindow", &W::RemoveChildWindow)
+        .Method("GetChildWindow", [](W& w) -> W* { return w.GetChildWindow(); })
+        .Method("GetChildWindow", [](const W& w) -> const W* { return w.GetChildWindow(); })
+        .Method("GetParentWindow", &W::GetParentWindow)
+        .Method("GetAbsPos", &W::GetAbsPos)
+        .Method("OnMouseMove", &W::OnMouseMove);
+}
+
+// The default handling of a window's input, in the form a hook gets its arguments.
+mluabind::i::GenericClass& WindowClass()
+{
+    using W = CWindow;
+    return Class<W>("CWindow")
+        .BaseClass<CBaseWindow>()
+        .Constructor<>()
+        .Method("SetCanDrag", &W::SetCanDrag)
+        .Method("IsCanDrag", &W::IsCanDrag)
+        .Method("HideToolTip", &W::HideToolTip)
+        .Method("SuperOnChar", &W::SuperOnChar)
+        .Method("SuperOnKeyDown", &W::SuperOnKeyDown)
+        .Method("SuperOnKeyUp", &W::SuperOnKeyUp)
+        .Method("SuperOnMouseMove", &W::SuperOnMouseMove)
+        .Method("SuperOnMouseMove",
+                [](W& w, int x, int y, int keys, bool broadcast) { return w.SuperOnMouseMove({x, y}, keys, broadcast); })
+        .Method("SuperOnMouseDown", &W::SuperOnMouseDown)
+        .Method("SuperOnMouseDown",
+                [](W& w, int x, int y, int button, int keys, bool broadcast) {
+                    return w.SuperOnMouseDown({x, y}, static_cast<MouseButtons>(button), keys, broadcast);
+                })
+        .Method("SuperOnMouseUp", &W::SuperOnMouseUp)
+        .Method("SuperOnMouseUp",
+                [](W& w, int x, int y, int button, int keys, bool broadcast) {
+                    return w.SuperOnMouseUp({x, y}, static_cast<MouseButtons>(button), keys, broadcast);
+                })
+        .Method("SuperOnDoubleClick", &W::SuperOnDoubleClick)
+        .Method("SuperOnDoubleClick",
+                [](W& w, int x, int y, int keys, bool broadcast) { return w.SuperOnDoubleClick({x, y}, keys, broadcast); })
+        .Method("SuperOnMouseWheel", &W::SuperOnMouseWheel)
+        .Method("SuperOnMouseWheel",
+                [](W& w, int x, int y, int delta, int keys, bool broadcast) {
+                    return w.SuperOnMouseWheel({x, y}, delta, keys, broadcast);
+                })
+        .Method("SuperOnChildAction", &W::SuperOnChildAction);
+}
+
+mluabind::i::GenericClass& LuaWidgetClass()
+{
+    using W = CLuaWidget;
+    return Class<W>("CLuaWidget")
+        .BaseClass<CWidget>()
+        .Constructor<>()
+        .Method("SetLua", &W::SetLua)
+        .Method("SetOverloadTable", &W::SetOverloadTable)
+        .Method("GetOverloadTable", &W::GetOverloadTable)
+        .Method("BaseDoDraw", &W::BaseDoDraw)
+        .Method("BaseDoUpdate", &W::BaseDoUpdate);
+}
+
+mluabind::i::GenericClass& CursorClass()
+{
+    using C = CCursor;
+    auto& cls = Class<C>("CCursor")
+                    .Method("SetCursor", &C::SetCursor)
+                    .Method("GetCursor", &C::GetCursor)
+                    .Method("SetCustomCursor", &C::SetCustomCursor)
+                    .Method("HideCursor", &C::HideCursor)
+                    .Method("IsHidden", &C::IsHidden)
+                    .Method("EnableCustomCursors", &C::EnableCustomCursors)
+                    .Method("IsCustomCursorsEnabled", &C::IsCustomCursorsEnabled)
+                    .Method("GetPosition", &C::GetPosition);
+    return WithConstants(cls, kCursorTypes);
+}
+
+} // namespace
+
+mluabind::Namespace BindGui()
+{
+    mluabind::Namespace ns("gui");
+    for (const NamedValue& v : kKeyCodes)
+        ns.AddConstant(Constant(v.name, v.value));
+    ns.AddClass(BaseWidgetClass());
+    ns.AddClass(WidgetClass());
+    ns.AddClass(mluabind::IntrusivePtrClass<CBaseWidget>("CBaseWidgetPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CWidget>("CWidgetPtrT"));
+    ns.AddClass(BaseWindowClass());
+    ns.AddClass(WindowClass());
+    ns.AddClass(LuaWidgetClass());
+    ns.AddClass(CursorClass());
+    ns.AddFunction(mluabind::Function("CCursor.Instance", &CCursor::Instance));
+    ns.AddFunction(mluabind::Function("g_Cursor.Instance", &CCursor::Instance));
+    ns.AddClass(Class<CWidgetManager>("CWidgetManager").Method("GetKeyboardState", &CWidgetManager::GetKeyboardState));
+    return ns;
+}
+
+} // namespace ox::gui

@@ -1,0 +1,14 @@
+#pragma once
+// Script names of the GUI's widgets, windows, cursor and widget manager. Run in declaration
+// mode and merge the result under "ox".
+#include "lua/mluabind/Binding.h"
+
+namespace ox::gui {
+
+// "gui": the key codes OX_* and the Justify values; CBaseWidget and CWidget with their
+// pointer classes CBaseWidgetPtrT and CWidgetPtrT; CBaseWindow, CWindow, CLuaWidget; CCursor
+// with CCursor.Instance and g_Cursor.Instance; CWidgetManager. Methods that take a window
+// move a script-made window into the GUI's keeping.
+mluabind::Namespace BindGui();
+
+} // namespace ox::gui

@@ -1,0 +1,44 @@
+#include "sound/SoundBinding.h"
+
+#include "sound/AudioManager.h"
+
+namespace ox::sound {
+
+mluabind::Namespace BindAudioManager()
+{
+    using mluabind::Class;
+    using M = CAudioManager;
+    using Handle = M::Handle;
+    mluabind::Namespace ns("core");
+    ns.AddClass(Class<M>("CAudioManager")
+                    .Method("IsAudioAvailable", &M::IsAudioAvailable)
+                    .Method("PauseAll", &M::PauseAll)
+                    .Method("GetGlobalVolume", &M::GetGlobalVolume)
+                    .Method("SetGlobalVolume", &M::SetGlobalVolume)
+                    .Method("SetVolume", static_cast<bool (M::*)(const char*, float, float, float)>(&M::SetVolume))
+                    .Method("SetVolume", static_cast<bool (M::*)(Handle, float, float, float)>(&M::SetVolume))
+                    .Method("GetVolume", static_cast<float (M::*)(const char*) const>(&M::GetVolume))
+                    .Method("GetVolume", static_cast<float (M::*)(Handle) const>(&M::GetVolume))
+                    .Method("GetMaxVolume", &M::GetMaxVolume)
+                    .Method("GetPosition", &M::GetPosition)
+                    .Method("SetPosition", &M::SetPosition)
+                    .Method("GetPriority", &M::GetPriority)
+                    .Method("GetRepeatCount", static_cast<int (M::*)(Handle) const>(&M::GetRepeatCount))
+                    .Method("GetBalance", &M::GetBalance)
+                    .Method("GetSpeed", &M::GetSpeed)
+                    .Method("GetLength", static_cast<double (M::*)(const char*) const>(&M::GetLength))
+                    .Method("Play", &M::Play)
+                    .Method("StopAll", &M::StopAll)
+                    .Method("Stop", static_cast<bool (M::*)(const char*, float)>(&M::Stop))
+                    .Method("Stop", static_cast<bool (M::*)(Handle, float)>(&M::Stop))
+                    .Method("IsSound", static_cast<bool (M::*)(const char*) const>(&M::IsSound))
+                    .Method("IsSound", static_cast<bool (M::*)(Handle) const>(&M::IsSound))
+                    .Method("SetGroupVolume", &M::SetGroupVolume)
+                    .Method("GetGroupVolume", &M::GetGroupVolume)
+                    .Method("StopGroup", &M::StopGroup)
+                    .Method("UnloadAllOnDemandSounds", &M::UnloadAllOnDemandSounds));
+    ns.AddFunction(mluabind::Function("CAudioManager.Instance", &M::Instance));
+    return ns;
+}
+
+} // namespace ox::sound
