@@ -123,14 +123,8 @@ void CApp::CloseOutput()
 // the audio manager and the GUI's windows and widgets, then the quest tree.
 void CApp::BindScripts()
 {
+    qe::BindFramework(*m_Lua);
     m_Lua->BeginBinding();
-    m_Lua->Bind(mluabind::BindStdStrings());
-    m_Lua->Bind(mluabind::Namespace("ox")
-                    .Merge(sound::BindAudioManager())
-                    .Merge(lua::BindFileWatcher())
-                    .Merge(lua::BindLuaClasses())
-                    .Merge(lua::BindGroupTimers())
-                    .Merge(gui::BindGui()));
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }

@@ -1,18 +1,25 @@
 #include "quest/QuestBinding.h"
 
 #include "graphics/Renderer.h"
+#include "core/Settings.h"
 #include "core/TimeManager.h"
+#include "diag/Assert.h"
+#include "gui/GuiBinding.h"
+#include "gui/Window.h"
 #include "lua/Lua.h"
+#include "lua/LuaBinding.h"
 #include "lua/mluabind/StdBinding.h"
 #include "misc/animation/ClipObjects.h"
 #include "quest/Area.h"
 #include "quest/ClipObject.h"
 #include "quest/ImageObject.h"
 #include "quest/LuaThreadManager.h"
+#include "quest/ObjectScripts.h"
 #include "quest/QuestData.h"
 #include "quest/PixelTest.h"
 #include "quest/Quest.h"
 #include "quest/SceneGroup.h"
+#include "sound/SoundBinding.h"
 
 namespace qe {
 
@@ -250,7 +257,17 @@ mluabind::Namespace Singletons()
     ns.AddFunction(mluabind::Function("g_LuaThreadManager.Instance", &g_LuaThreadManager::Instance));
     ns.AddClass(Class<CQuestData>("CQuestData").Method("Load", &CQuestData::Load).Method("CreateLevel", &CQuestData::CreateLevel));
     ns.AddFunction(mluabind::Function("g_QuestData.Instance", &g_QuestData::Instance));
+    ns.AddFunction(mluabind::Function("CSceneWidget.ClearScriptCache", [] { GetObjectScripts().Clear(); }));
     return ns;
+}
+
+// An object's script of a kind, run as a scene widget runs it; scripts reach it while no
+// widget shows the scene.
+void RunObjectScript(int kind, CBaseSceneObject* object, bool withEvents, bool isClick)
+{
+    OX_CHECK_DATA(object != nullptr);
+    OX_CHECK_DATA(kind >= 0 && kind < CBaseSceneObject::ScriptCount);
+    GetObjectScripts().Run(kind, *object, withEvents, isClick);
 }
 
 } // namespace
@@ -264,7 +281,38 @@ mluabind::Namespace BindQuestClasses()
     ns.AddFunction(mluabind::Function("GetClipTime", &GetClipTime));
     ns.AddFunction(mluabind::Function("Clip_GetObjectById", &Clip_GetObjectById));
     ns.AddFunction(mluabind::Function("TryAlpha", &TryAlpha));
+    ns.AddFunction(mluabind::Function("StartLevel", &StartLevel));
+    ns.AddFunction(mluabind::Function("RunObjectScript", &RunObjectScript));
     return ns;
+}
+
+void BindFramework(mluabind::CHost& host)
+{
+    host.BeginBinding();
+    host.Bind(mluabind::BindStdStrings());
+    host.Bind(mluabind::Namespace("ox")
+                  .Merge(ox::sound::BindAudioManager())
+                  .Merge(ox::lua::BindFileWatcher())
+                  .Merge(ox::lua::BindLuaClasses())
+                  .Merge(ox::lua::BindGroupTimers())
+                  .Merge(ox::gui::BindGui()));
+    host.EndBinding();
+}
+
+int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, const std::string& a,
+               const ox::core::CSettings* settings, const std::string& initScript, const ox::wstring& b,
+               const std::string& c, bool d)
+{
+    OX_CHECK_DATA(lua != nullptr, 0);
+    // Quest classes derive from framework classes, which must be known first.
+    if (!lua->FindClass(typeid(ox::lua::CLua)))
+        BindFramework(*lua);
+    lua->BeginBinding();
+    lua->Bind(BindQuestClasses());
+    lua->EndBinding();
+    lua->Run("__g_InitScript = function () " + initScript + " end");
+    lua->LoadScript("scripts/game_engine/quest.lua");
+    return ox::lua::CallLuaFunction<int>(lua, "quest.StartLevel", window, level, a, settings, b, c, d);
 }
 
 } // namespace qe

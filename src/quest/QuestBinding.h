@@ -3,8 +3,23 @@
 // result: it is the table "qe". Classes are bound bases first, with their pointer classes
 // (qe.CBaseSceneObjectPtrT, ...), the walks over their lists and their constants.
 #include "lua/mluabind/Binding.h"
+#include "misc/WideChar.h"
+
+#include <string>
+
+namespace ox::core {
+class CSettings;
+}
+namespace ox::gui {
+class CWindow;
+}
+namespace ox::lua {
+class CLua;
+}
 
 namespace qe {
+
+class CLevel;
 
 // "qe": CTreeNode, CBaseSceneObject, CSceneGroup, CSceneObject, CObject, CAreaPoint,
 // CImageObject, CClipObject, CArea, CQuest, CLevel, CScene; CAreaPointPtrT,
@@ -12,6 +27,23 @@ namespace qe {
 // CQuest.LevelIteratorT, CLevel.SceneIteratorT, CArea.PointIteratorT and
 // CSceneGroup.GroupChildIteratorT (which also walks a scene's lists); the functions
 // GetClipTime, Clip_GetObjectById and TryAlpha.
+// GetClipTime, Clip_GetObjectById, TryAlpha, StartLevel and RunObjectScript; the nested
+// table CSceneWidget with ClearScriptCache.
 mluabind::Namespace BindQuestClasses();
+
+// The framework's vocabulary, which the quest classes build on: std strings and "ox" (audio
+// manager, file watcher, Lua hosts, group timers, windows and widgets). Binds in declaration
+// mode on its own.
+void BindFramework(mluabind::CHost& host);
+
+// Starts a level in its Lua host (the one listed as qe_level): binds the framework's
+// vocabulary when the host lacks it, then "qe"; defines the global __g_InitScript as a
+// function with `initScript` as its body; loads scripts/game_engine/quest.lua; and returns
+// what quest.StartLevel(window, level, a, settings, b, c, d) returns. `a` to `d` belong to
+// the game's scripts and are only passed on. A failure is reported by the host; a
+// quest.StartLevel that fails or returns no number gives 0.
+int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, const std::string& a,
+               const ox::core::CSettings* settings, const std::string& initScript, const ox::wstring& b,
+               const std::string& c, bool d);
 
 } // namespace qe
