@@ -111,8 +111,15 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     // scripts/main.lua ran and its Init was called once the window was up.
     EXPECT_TRUE(run.WaitForOutput("Lantern Demo Init: Lua 5.1 in host 'main', lfs present", std::chrono::seconds(5)))
         << run.Output();
-    // A script thread waits on the level clock.
+    // Once loaded, level1 starts in its own host: the init script, then the level's start
+    // script, which clicks the lamp; the lamp's click script runs as a script thread of the
+    // level host and waits on the level clock.
     EXPECT_TRUE(run.WaitForOutput("Lantern Demo: the lamp flickered 3 times on the level clock", std::chrono::seconds(5)))
+        << run.Output();
+    EXPECT_TRUE(LogHasInOrder(run.Output(), {"Lantern Demo: the init script runs",
+                                             "Lantern Demo: level level1 starts in host qe_level",
+                                             "Lantern Demo: the level starts", "Lantern Demo: the lamp click script runs",
+                                             "Lantern Demo: qe.StartLevel gave 1"}))
         << run.Output();
 
     // Editing the main script while the game runs runs it again in the same state: what

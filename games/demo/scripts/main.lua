@@ -18,26 +18,15 @@ function Init()
     lantern.host = text(ox.lua.CLua.GetLua("main").GetId())
     print("Lantern Demo Init: " .. _VERSION .. " in host '" .. lantern.host .. "', lfs " ..
           (lfs and "present" or "missing"))
-    StartThreads()
 end
 
--- Script threads run in this host on the clock of the group "level" under "main": pausing
--- that group pauses every wait. The scheduler is scripts/game_engine/quest.lua.
-function StartThreads()
-    local main = ox.lua.CLua.GetLua("main")
-    main.LoadScript("scripts/game_engine/quest.lua")
-    local clock = ox.core.GetRootGroupTimer().GetChildGroupTimer("main")
-    lantern.clock = clock.GetChildGroupTimer("level") or clock.AttachGroupTimer("level")
-    local threads = qe.g_LuaThreadManager.Instance()
-    threads.SetLua(main)
-    threads.SetTimer(lantern.clock)
-    CreateScript("lantern_start", nil)
-end
-
--- The first thread: once loading is over (the next frame), the level is built from the
--- quest data and its lamp flickers on the level clock.
-function lantern_start(self)
-    wait(0)
+-- Once loading is over, level1 is built from the quest data and started in a Lua host of its
+-- own, listed as qe_level. From there scripts/game_engine/quest.lua runs the level: its script
+-- threads, on the clock of the group "level" under "main", and its objects' scripts.
+function StartLevel()
+    if lantern.level then
+        return
+    end
     local level = qe.g_QuestData.Instance().CreateLevel("level1")
     if not level then
         print("Lantern Demo: the quest data has no level1")
@@ -52,14 +41,10 @@ function lantern_start(self)
     end
     print("Lantern Demo: level1 built from the quest data: " .. lantern.level.EnumScenes() .. " scenes, " ..
           objects .. " objects")
-    local lamp = __cast(lantern.level.FindObjectById("lamp", false, false), "qe.CSceneGroup")
-    for i = 1, 3 do
-        lamp.SetCurrentByNumber(2)
-        wait(100)
-        lamp.SetCurrentByNumber(1)
-        wait(100)
-    end
-    print("Lantern Demo: the lamp flickered 3 times on the level clock")
+    lantern.level_lua = lantern.level_lua or ox.lua.CLua("qe_level", true)
+    local started = qe.StartLevel(lantern.level_lua, nil, level, "level1", nil,
+                                  "print('Lantern Demo: the init script runs')", "The Lantern", "", false)
+    print("Lantern Demo: qe.StartLevel gave " .. started)
 end
 
 -- Each kind of sound has a volume group of its own (properties/sounds.xml).
@@ -78,6 +63,7 @@ function Run()
     end
     print("Lantern Demo Run: music " .. (lantern.music ~= 0 and "plays" or "is silent") ..
           (audio.IsAudioAvailable() and "" or " (no audio output)"))
+    StartLevel()
 end
 
 -- The first window's hooks (gui.xml, window "loading"). Each gets the window first. A
@@ -132,4 +118,7 @@ end
 
 function quest.OnClose()
     print("Lantern Demo quest.OnClose: the lantern goes out")
+    -- The level ends: no more threads, and the script cache lets its objects go.
+    qe.g_LuaThreadManager.Instance().Clear()
+    qe.CSceneWidget.ClearScriptCache()
 end

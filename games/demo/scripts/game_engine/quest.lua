@@ -2,7 +2,8 @@
 -- the engine starts one through CreateScript and calls ManageThreads once per frame, which
 -- resumes every thread whose wait is over. Time is the clock the thread manager was given
 -- (qe.g_LuaThreadManager.Instance().SetTimer), so pausing that group pauses every wait.
--- Whoever loads this file hands the threads' host to the manager (SetLua).
+-- qe.StartLevel loads it into the level's host (qe_level) and calls quest.StartLevel, which
+-- hands that host and the level clock to the manager.
 
 quest = quest or {}
 -- Kept across reloads of the file: the threads already running go on.
@@ -110,3 +111,29 @@ function pre_click_event() end
 function post_click_event() end
 function wrone_item_click() end
 function empty_script_function(self) end
+
+-- The start of a level, called by qe.StartLevel in the level's host: the threads run here on
+-- the clock of the group "level" under "main"; then the init script given to qe.StartLevel
+-- and the level's start script run. `id` is the level's id; the demo has no use for the
+-- window, settings, title, mode and restart flag. Answers 1: the level runs.
+function quest.StartLevel(window, level, id, settings, title, mode, restart)
+    quest.level = level
+    threads.list = {}
+    local main = ox.core.GetRootGroupTimer().GetChildGroupTimer("main")
+    manager().SetLua(ox.lua.CLua.GetLua("qe_level"))
+    manager().SetTimer(main.GetChildGroupTimer("level") or main.AttachGroupTimer("level"))
+    __g_InitScript()
+    print("Lantern Demo: level " .. text(id) .. " starts in host qe_level")
+    level.RunStartLevelScript()
+    return 1
+end
+
+-- Runs the click script of the running level's object `id`, as a click on it would.
+function quest.Click(id)
+    local object = quest.level and quest.level.FindObjectById(id, false, false)
+    if not object then
+        manager().Error("quest.Click: the level has no object " .. id)
+        return
+    end
+    qe.RunObjectScript(qe.CBaseSceneObject.ScriptMouseClick, object, true, true)
+end
