@@ -7,10 +7,7 @@
 #include "diag/Log.h"
 #include "game/LoadWindow.h"
 #include "gui/Cursor.h"
-#include "gui/GuiBinding.h"
-#include "lua/LuaBinding.h"
 #include "lua/LuaHeap.h"
-#include "lua/mluabind/StdBinding.h"
 #include "graphics/Font.h"
 #include "misc/Unicode.h"
 #include "misc/animation/Clip.h"
@@ -21,7 +18,6 @@
 #include "quest/QuestBinding.h"
 #include "quest/QuestData.h"
 #include "sound/AudioManager.h"
-#include "sound/SoundBinding.h"
 #include "sound/SoundDeclarations.h"
 
 #include <fcntl.h>

@@ -3,7 +3,10 @@
 // returns; failures of the script side are reported and give 0.
 #include "lua/Lua.h"
 #include "lua/LuaTestHost.h"
+#include "quest/ImageObject.h"
 #include "quest/Level.h"
+#include "quest/LuaThreadManager.h"
+#include "quest/ObjectScripts.h"
 #include "quest/QuestBinding.h"
 #include "support/TestSupport.h"
 
@@ -93,4 +96,45 @@ TEST_F(StartLevelTest, AFailingQuestStartLevelIsReportedAndGivesZero)
     EXPECT_NE(LuaErrors().find("the level is broken"), std::string::npos) << LuaErrors();
     // Without a host nothing runs, and the data check says so.
     EXPECT_EQ(StartLevel(nullptr, nullptr, nullptr, "", nullptr, "", u"", "", false), 0);
+}
+
+// The level's own script side starts an object's click script: it is compiled into the level
+// host under its generated name and started there as a thread.
+TEST_F(StartLevelTest, AnObjectScriptRunsInTheLevelHostThroughItsGeneratedFunction)
+{
+    dir.Write("scripts/game_engine/quest.lua", R"(
+        quest = quest or {}
+        function quest.SetScriptObject(o) end
+        function pre_click_event() end
+        function post_click_event() end
+        function wrone_item_click() end
+        function CreateScript(name, o) started = name.c_str() _G[name.c_str()](o) end
+        function quest.StartLevel(window, level)
+            qe.g_LuaThreadManager.Instance().SetLua(ox.lua.CLua.GetLua('qe_level'))
+            local key = level.FindObjectById('key', false, false)
+            qe.RunObjectScript(qe.CBaseSceneObject.ScriptMouseClick, key, true, true)
+            qe.RunObjectScript(99, key, true, true)
+            qe.RunObjectScript(qe.CBaseSceneObject.ScriptMouseClick, nil, true, true)
+            return 1
+        end)");
+    GetObjectScripts().Clear();
+    ASSERT_TRUE(main.Run(R"(
+        lvl = qe.CLevel()
+        local scene = qe.CScene()
+        lvl.InsertScene(qe.CScenePtrT(scene), nil)
+        local key = qe.CImageObject()
+        key.SetId('key')
+        key.SetLuaScript(std.string('clicked = self.GetId().c_str()'), qe.CBaseSceneObject.ScriptMouseClick)
+        scene.InsertObject(qe.CBaseSceneObjectPtrT(key), nil))"));
+    oxtest::LogCapture log;
+    EXPECT_EQ(Start(), "1");
+    EXPECT_EQ(Eval(level, "started"), "__object_script_0");
+    EXPECT_EQ(Eval(level, "clicked"), "key");
+    EXPECT_TRUE(log.Contains("kind >= 0 && kind < CBaseSceneObject::ScriptCount"));
+    EXPECT_TRUE(log.Contains("object != nullptr"));
+    EXPECT_TRUE(LuaErrors().empty()) << LuaErrors();
+    // The script side ends the level: the cache lets the key go.
+    ASSERT_TRUE(main.Run("qe.CSceneWidget.ClearScriptCache()"));
+    EXPECT_EQ(GetObjectScripts().CachedObjects(), 0u);
+    g_LuaThreadManager::Instance().Clear();
 }
