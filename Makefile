@@ -4,8 +4,11 @@ BUILD_TYPE ?= RelWithDebInfo
 CTEST_ARGS ?=
 FUZZ_DIR ?= fuzz-build
 FUZZ_SECONDS ?= 60
+FUZZ_RSS_MB ?= 1024
+FUZZ_TARGETS ?=
+ASAN_DIR ?= build-asan
 
-.PHONY: all deps configure build test run bench fuzz clean
+.PHONY: all deps configure build test test-asan run bench fuzz clean
 
 all: build
 
@@ -21,6 +24,14 @@ build: configure
 test: build
 	@cd $(BUILD_DIR) && ctest --output-on-failure -j2 $(CTEST_ARGS)
 
+# The whole test suite built with AddressSanitizer and UBSan in its own folder; a finding
+# ends the program, so the test that meets it fails.
+test-asan: deps
+	@cmake -S . -B $(ASAN_DIR) -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo -DOX_SANITIZE=ON -DOX_BUILD_BENCH=OFF >/dev/null
+	@cmake --build $(ASAN_DIR)
+	@cd $(ASAN_DIR) && ASAN_OPTIONS=detect_leaks=1:check_initialization_order=1 UBSAN_OPTIONS=print_stacktrace=1 \
+		ctest --output-on-failure -j2 $(CTEST_ARGS)
+
 run: build
 	@if [ -x $(BUILD_DIR)/src/k17 ]; then \
 		cd games/demo && exec ../../$(BUILD_DIR)/src/k17; \
@@ -32,24 +43,30 @@ run: build
 bench: build
 	@for b in $(BUILD_DIR)/bench/bench_*; do [ -x "$$b" ] && "$$b"; done
 
-# Builds every fuzz/fuzz_* target with clang and runs each for FUZZ_SECONDS; findings
-# (crash-*, leak-*, timeout-*) land in $(FUZZ_DIR)/findings.
+# Builds every fuzz/fuzz_* target with clang and runs each (or those named in FUZZ_TARGETS) for
+# FUZZ_SECONDS under an RSS limit; findings (crash-*, leak-*, timeout-*, oom-*) land in
+# $(FUZZ_DIR)/findings. A target with a finding does not stop the others.
 fuzz: deps
 	@CC=clang CXX=clang++ cmake -S . -B $(FUZZ_DIR) -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
 		-DOX_BUILD_FUZZ=ON -DOX_BUILD_TESTS=OFF -DOX_BUILD_BENCH=OFF >/dev/null
 	@cmake --build $(FUZZ_DIR)
 	@mkdir -p $(FUZZ_DIR)/findings
-	@for f in $(FUZZ_DIR)/fuzz/fuzz_*; do \
-		[ -x "$$f" ] || continue; \
-		name=$$(basename $$f); mkdir -p $(FUZZ_DIR)/corpus/$$name; \
+	@failed=""; \
+	for f in $(if $(FUZZ_TARGETS),$(addprefix $(FUZZ_DIR)/fuzz/,$(FUZZ_TARGETS)),$(FUZZ_DIR)/fuzz/fuzz_*); do \
+		name=$$(basename $$f); \
+		[ -x "$$f" ] || { echo "fuzz: no target $$name"; failed="$$failed $$name"; continue; }; \
+		mkdir -p $(FUZZ_DIR)/corpus/$$name; \
 		seeds=""; [ -d fuzz/corpus/$$name ] && seeds=fuzz/corpus/$$name; \
 		echo "fuzz: $$name for $(FUZZ_SECONDS) s"; \
-		if ! "$$f" -max_total_time=$(FUZZ_SECONDS) -artifact_prefix=$(FUZZ_DIR)/findings/$$name- \
+		if "$$f" -max_total_time=$(FUZZ_SECONDS) -rss_limit_mb=$(FUZZ_RSS_MB) \
+			-artifact_prefix=$(FUZZ_DIR)/findings/$$name- \
 			$(FUZZ_DIR)/corpus/$$name $$seeds >$(FUZZ_DIR)/$$name.log 2>&1; then \
-			tail -40 $(FUZZ_DIR)/$$name.log; exit 1; \
+			grep -E "^#[0-9]+ +DONE|Done [0-9]+ runs" $(FUZZ_DIR)/$$name.log | tail -2; \
+		else \
+			tail -40 $(FUZZ_DIR)/$$name.log; failed="$$failed $$name"; \
 		fi; \
-		grep -E "^#[0-9]+ +DONE|Done [0-9]+ runs" $(FUZZ_DIR)/$$name.log | tail -2; \
-	done
+	done; \
+	if [ -n "$$failed" ]; then echo "fuzz: findings in$$failed (see $(FUZZ_DIR)/findings)"; exit 1; fi
 
 clean:
-	rm -rf $(BUILD_DIR) $(FUZZ_DIR)
+	rm -rf $(BUILD_DIR) $(FUZZ_DIR) $(ASAN_DIR)

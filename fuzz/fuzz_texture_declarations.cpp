@@ -40,8 +40,13 @@ void Walk(const CTextureDeclarationsLoader& loader)
         if (loader.FindImageIndex(entry.id.c_str()) != static_cast<int>(i))
             __builtin_trap();  // a checked table must find each of its ids
         const auto* desc = loader.Desc(entry);
-        for (unsigned p = 0; p < desc->parts_amount; ++p)
-            sum += static_cast<uint32_t>(desc->Parts()[p].u2 * 16);
+        for (unsigned p = 0; p < desc->parts_amount; ++p) {
+            // The bits, not the value: a float from the dump may be any number, and
+            // converting one out of range to an integer is undefined.
+            uint32_t bits;
+            memcpy(&bits, &desc->Parts()[p].u2, sizeof bits);
+            sum += bits;
+        }
         sum += loader.Surfaces()[loader.SurfaceIndex(*desc)].height;
         if (const auto* group = loader.Group(entry.group))
             sum += group->flags;

@@ -1,5 +1,6 @@
 // Feeds arbitrary bytes to the XML event parser (all callbacks, reading every name, value and
-// text it hands out) and to a settings load, then walks and copies the tree.
+// text it hands out) and to a settings load, then walks and copies the tree. The names the
+// trees made must go with them.
 #include "core/Settings.h"
 #include "core/SettingsReaders.h"
 #include "misc/XmlParser.h"
@@ -39,9 +40,7 @@ void Walk(const ox::core::CSettingsGroup& group, int depth)
     (void)group.GetNextSibling();
 }
 
-} // namespace
-
-extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
+void Exercise(const uint8_t* data, size_t size)
 {
     // An exact copy: a read one byte past the input is caught by the sanitizer.
     std::vector<char> bytes(data, data + size);
@@ -65,5 +64,17 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
     ox::core::CSettings copy;
     settings.CopyTo(copy);
     (void)copy.GetChild("scene", true).GetNamedChild("hero", true).GetValue("name");
+}
+
+} // namespace
+
+// Names the trees of one input made go with them: what exists after an input is what
+// existed before the first.
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
+{
+    static const size_t ids = (ox::core::EmptyId(), ox::core::IdCount());
+    Exercise(data, size);
+    if (ox::core::IdCount() != ids)
+        __builtin_trap();
     return 0;
 }

@@ -20,23 +20,22 @@ namespace {
 
 using misc::StringA88;
 
-struct IdLess {
+struct NameLess {
     using is_transparent = void;
-    bool operator()(const StringA88& a, const StringA88& b) const { return a.view() < b.view(); }
-    bool operator()(const StringA88& a, std::string_view b) const { return a.view() < b; }
-    bool operator()(std::string_view a, const StringA88& b) const { return a < b.view(); }
+    bool operator()(const InternedName& a, const InternedName& b) const { return a.name.view() < b.name.view(); }
+    bool operator()(const InternedName& a, std::string_view b) const { return a.name.view() < b; }
+    bool operator()(std::string_view a, const InternedName& b) const { return a < b.name.view(); }
 };
 
 // Never destroyed: trees in static objects may outlive any other static.
-std::set<StringA88, IdLess>& IdPool()
+std::set<InternedName, NameLess>& IdPool()
 {
-    static auto* pool = new std::set<StringA88, IdLess>();
+    static auto* pool = new std::set<InternedName, NameLess>();
     return *pool;
 }
 
-} // namespace
-
-const StringA88* InternId(std::string_view name)
+// Takes a reference to the identifier of `name`, creating it at first sight.
+const InternedName& Acquire(std::string_view name)
 {
     OX_ASSERT(name.size() <= kMaxIdLength);
     if (name.size() > kMaxIdLength)
@@ -46,29 +45,60 @@ const StringA88* InternId(std::string_view name)
     auto& pool = IdPool();
     auto where = pool.find(name);
     if (where == pool.end())
-        where = pool.emplace(name).first;
-    return &*where;
+        where = pool.insert(InternedName{StringA88(name)}).first;
+    ++where->refs;
+    return *where;
 }
+
+// Held forever: the empty identifier is what every unnamed node and every miss refers to.
+const InternedName& EmptyEntry()
+{
+    static const InternedName& empty = Acquire({});
+    return empty;
+}
+
+} // namespace
+
+SettingsId::SettingsId() : m_Entry(&EmptyEntry()) { ++m_Entry->refs; }
+
+SettingsId::SettingsId(std::string_view name) : m_Entry(&Acquire(name)) {}
+
+SettingsId::SettingsId(const SettingsId& other) : m_Entry(other.m_Entry)
+{
+    if (m_Entry)
+        ++m_Entry->refs;
+}
+
+SettingsId::~SettingsId()
+{
+    if (!m_Entry)
+        return; // moved from
+    OX_ASSERT(m_Entry->refs > 0);
+    if (--m_Entry->refs == 0) {
+        auto& pool = IdPool();
+        pool.erase(pool.find(m_Entry->name.view()));
+    }
+}
+
+const StringA88* InternId(std::string_view name) { return &Acquire(name).name; }
 
 const StringA88* FindId(std::string_view name)
 {
     auto& pool = IdPool();
     auto where = pool.find(name);
-    return where == pool.end() ? nullptr : &*where;
+    return where == pool.end() ? nullptr : &where->name;
 }
 
-const StringA88& EmptyId()
-{
-    static const StringA88* empty = InternId({});
-    return *empty;
-}
+const StringA88& EmptyId() { return EmptyEntry().name; }
+
+size_t IdCount() { return IdPool().size(); }
 
 // ---------------------------------------------------------------------------------------
 // CSettingsGroup
 
-CSettingsGroup::CSettingsGroup() : m_Id(&EmptyId()) {}
+CSettingsGroup::CSettingsGroup() = default;
 
-CSettingsGroup::CSettingsGroup(const String& id) : m_Id(InternId(id.view())) {}
+CSettingsGroup::CSettingsGroup(const String& id) : m_Id(id.view()) {}
 
 CSettingsGroup::~CSettingsGroup()
 {
@@ -95,7 +125,7 @@ void CSettingsGroup::AddChild(SettingsGroupPtrT child, const String& name)
         return;
     child->m_Parent = this;
     if (!name.empty())
-        m_NamedChildren.emplace_back(InternId(name.view()), child);
+        m_NamedChildren.emplace_back(SettingsId(name.view()), child);
     m_Children.push_back(std::move(child));
 }
 
@@ -121,7 +151,7 @@ unsigned CSettingsGroup::EnumChildren(const String& name) const
     if (!id)
         return 0;
     return static_cast<unsigned>(std::count_if(m_Children.begin(), m_Children.end(),
-                                               [id](const SettingsGroupPtrT& p) { return p->m_Id == id; }));
+                                               [id](const SettingsGroupPtrT& p) { return p->m_Id.get() == id; }));
 }
 
 const CSettingsGroup& CSettingsGroup::GetFirstChild() const
@@ -139,7 +169,7 @@ CSettingsGroup* CSettingsGroup::FindChild(const String* id, const String* attrib
                                           bool recursive) const
 {
     for (const auto& child : m_Children) {
-        if (child->m_Id == id) {
+        if (child->m_Id.get() == id) {
             if (!attribute)
                 return child.get();
             const CSettingsRefCountedConstString* found = child->FindValue(attribute->view());
@@ -184,7 +214,7 @@ const CSettingsGroup& CSettingsGroup::GetChildByAttribute(const String& element,
 CSettingsGroup* CSettingsGroup::FindNamedChild(const String* id, bool recursive) const
 {
     for (const auto& [name, child] : m_NamedChildren) {
-        if (name == id)
+        if (name.get() == id)
             return child.get();
         if (recursive && !child->m_NamedChildren.empty()) {
             if (CSettingsGroup* deeper = child->FindNamedChild(id, true))
@@ -224,16 +254,16 @@ const CSettingsGroup& CSettingsGroup::GetNextSibling() const
     return found ? *found : Empty();
 }
 
-void CSettingsGroup::AddValue(const String* id, std::string_view value)
+void CSettingsGroup::AddValue(SettingsId id, std::string_view value)
 {
     // The vector is sorted already: inserting behind all equal names is what appending and a
     // stable sort give. Of two equal names the first added stays in front, where the search lands.
     auto where = std::upper_bound(m_Attributes.begin(), m_Attributes.end(), id->view(),
                                   [](std::string_view n, const Attribute& a) { return n < a.first->view(); });
-    m_Attributes.emplace(where, id, CSettingsRefCountedConstString(value));
+    m_Attributes.emplace(where, std::move(id), CSettingsRefCountedConstString(value));
 }
 
-void CSettingsGroup::AddValue(const String& name, const std::string& value) { AddValue(InternId(name.view()), value); }
+void CSettingsGroup::AddValue(const String& name, const std::string& value) { AddValue(SettingsId(name.view()), value); }
 
 void CSettingsGroup::AddValue(const char* name, const char* value)
 {
@@ -372,7 +402,7 @@ struct SettingsLoader {
         auto& context = *static_cast<LoadContext*>(user);
         misc::XmlRecord& record = stack[depth];
         if (CSettingsGroup* node = NodeOf(record)) {
-            node->AddValue(InternId(context.CheckedName(name, nameLength, name)), std::string_view(value, valueLength));
+            node->AddValue(SettingsId(context.CheckedName(name, nameLength, name)), std::string_view(value, valueLength));
         } else if (std::string* pending = PendingNameOf(record)) {
             if (std::string_view(name, nameLength) == "name")
                 pending->assign(value, valueLength);

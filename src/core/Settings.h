@@ -1,7 +1,7 @@
 #pragma once
 // The settings tree: XML elements become nodes, attributes become pooled string values.
 // Element and attribute names are interned: equal names share one identifier object, so
-// names compare by address. Look-ups that find nothing return static empty objects, so that
+// names compare by address; an identifier goes when no tree uses it any more. Look-ups that find nothing return static empty objects, so that
 // calls chain without tests; the "Ref" forms return null instead.
 #include "core/SettingsValue.h"
 #include "misc/String.h"
@@ -23,19 +23,53 @@ using SettingsGroupPtrT = boost::shared_ptr<CSettingsGroup>;
 // The longest name an identifier holds.
 constexpr size_t kMaxIdLength = misc::StringA88::kCapacity - 1;
 
-// The identifier of `name` (at most kMaxIdLength characters), created at first sight and kept to the
-// end of the process.
+// An interned name and the number of references to it.
+struct InternedName {
+    misc::StringA88 name;
+    mutable size_t refs = 0;
+};
+
+// A counted reference to an identifier: equal names share one identifier, which lives while a
+// reference to it does (a tree holds one per node id and attribute name), so names that no
+// tree uses any more are released.
+class SettingsId {
+public:
+    // The empty identifier.
+    SettingsId();
+    // The identifier of `name` (at most kMaxIdLength characters), created at first sight.
+    explicit SettingsId(std::string_view name);
+    SettingsId(const SettingsId& other);
+    SettingsId(SettingsId&& other) noexcept : m_Entry(other.m_Entry) { other.m_Entry = nullptr; }
+    SettingsId& operator=(SettingsId other) noexcept
+    {
+        std::swap(m_Entry, other.m_Entry);
+        return *this;
+    }
+    ~SettingsId();
+
+    const misc::StringA88* get() const { return &m_Entry->name; }
+    const misc::StringA88& operator*() const { return m_Entry->name; }
+    const misc::StringA88* operator->() const { return &m_Entry->name; }
+
+private:
+    const InternedName* m_Entry;
+};
+
+// The identifier of `name` (at most kMaxIdLength characters), created at first sight and kept to
+// the end of the process: for holders that keep bare pointers (declarations).
 const misc::StringA88* InternId(std::string_view name);
-// The identifier of `name` if it was ever interned, else null.
+// The identifier of `name` if one exists, else null.
 const misc::StringA88* FindId(std::string_view name);
 // The empty identifier.
 const misc::StringA88& EmptyId();
+// Identifiers that exist now.
+size_t IdCount();
 
 class CSettingsGroup {
 public:
     using String = misc::StringA88;
-    using Attribute = std::pair<const String*, CSettingsRefCountedConstString>;
-    using NamedChild = std::pair<const String*, SettingsGroupPtrT>;
+    using Attribute = std::pair<SettingsId, CSettingsRefCountedConstString>;
+    using NamedChild = std::pair<SettingsId, SettingsGroupPtrT>;
 
     CSettingsGroup();
     explicit CSettingsGroup(const String& id);
@@ -95,13 +129,13 @@ public:
 private:
     friend struct SettingsLoader;
 
-    void AddValue(const String* id, std::string_view value);
+    void AddValue(SettingsId id, std::string_view value);
     const CSettingsRefCountedConstString* FindValue(std::string_view name) const;
     CSettingsGroup* FindChild(const String* id, const String* attribute, const std::string* value,
                               bool recursive) const;
     CSettingsGroup* FindNamedChild(const String* id, bool recursive) const;
 
-    const String* m_Id;
+    SettingsId m_Id;
     CSettingsGroup* m_Parent = nullptr;
     std::vector<SettingsGroupPtrT> m_Children;
     std::vector<NamedChild> m_NamedChildren;

@@ -314,8 +314,9 @@ void FinishImage(Conversion& c)
             return;
         }
         const float w = surface.width, h = surface.height;
+        // The far edges are summed as floats: a part's numbers may be anything an int holds.
         for (const PartRect& p : image.parts)
-            parts.push_back({p.x / w, p.y / h, (p.x + p.w) / w, (p.y + p.h) / h});
+            parts.push_back({p.x / w, p.y / h, (float(p.x) + float(p.w)) / w, (float(p.y) + float(p.h)) / h});
         frameWidth = image.parts[0].w;
         frameHeight = image.parts[0].h;
     } else {

@@ -9,6 +9,7 @@
 
 using namespace ox::core;
 using ox::graphics::Color;
+using ox::misc::StringA88;
 
 namespace {
 
@@ -235,6 +236,46 @@ TEST(SettingsValues, PoolsAndCountersAcrossTheCollector)
         EXPECT_EQ(CSettingsRefCountedConstString::EntryCount(), entries0 + 19) << "every unused entry is erased";
         EXPECT_EQ(values.front().Get(), std::string(99, 'b') + "00") << "live values stay";
     }
+}
+
+TEST(SettingsIds, NamesNoTreeUsesAreReleased)
+{
+    // A large description whose element, attribute and child names are new on every round,
+    // as a long session of varied files (or a fuzzer) gives them.
+    auto description = [](int round) {
+        std::string xml = "<?xml version=\"1.0\"?>\n<root>";
+        for (int i = 0; i < 300; ++i) {
+            const std::string n = std::to_string(round) + "_" + std::to_string(i);
+            xml += "<el" + n + " at" + n + "=\"v" + n + "\"><named_object name=\"nm" + n + "\"><leaf/></named_object></el" + n + ">";
+        }
+        return xml + "</root>";
+    };
+    CSettings kept;
+    ASSERT_TRUE(Load(kept, "<?xml version=\"1.0\"?><kept_root kept_value=\"1\"/>"));
+    const StringA88* pinned = InternId("pinned_for_good");
+    const size_t ids0 = IdCount();
+    CSettingsRefCountedConstString::CollectGarbage();
+    const size_t values0 = CSettingsRefCountedConstString::EntryCount();
+
+    auto copy = boost::make_shared<CSettings>();
+    for (int round = 0; round < 30; ++round) {
+        CSettings settings;
+        ASSERT_TRUE(Load(settings, description(round)));
+        if (round == 0)
+            settings.CopyTo(*copy);
+    }
+    EXPECT_EQ(IdCount(), ids0 + 902) << "only the copy's names are left (900, root and leaf)";
+    const CSettingsGroup& element = copy->GetChild("root").GetChild("el0_7");
+    EXPECT_EQ(element.GetValue("at0_7"), "v0_7");
+    EXPECT_EQ(element.GetNamedChild("nm0_7").GetId().view(), "leaf");
+    EXPECT_EQ(FindId("el1_7"), nullptr);
+
+    copy.reset();
+    EXPECT_EQ(IdCount(), ids0);
+    EXPECT_EQ(FindId("el0_7"), nullptr);
+    EXPECT_EQ(FindId("pinned_for_good"), pinned) << "a name handed out for good stays";
+    EXPECT_EQ(kept.GetChild("kept_root").GetValue("kept_value"), "1");
+    EXPECT_LT(CSettingsRefCountedConstString::EntryCount(), values0 + 1000) << "values are collected too";
 }
 
 TEST(SettingsReaders, TypedValuesAndBadInput)

@@ -220,6 +220,20 @@ TEST(TextureDeclarations, FrameMapsForEachAnimationType)
     EXPECT_TRUE(log.Contains("image \"x\" has 2147483647 x 90 frames, more than 512; ignored"));
 }
 
+TEST(TextureDeclarations, PartsAtTheEndsOfTheNumberRangeConvert)
+{
+    GameFolder game;
+    const std::string xml = Declarations(
+        "<surfaces><surface path=\"s.png\" width=\"64\" height=\"32\"/></surfaces><group id=\"g\">"
+        "<image id=\"x\" path=\"s.png\"><part rect_x=\"1\" rect_y=\"-2147483647\" rect_w=\"2147483647\" "
+        "rect_h=\"-2147483647\"/></image></group>");
+    CTextureDeclarationsLoader loader(&game.Pack());
+    ASSERT_TRUE(loader.LoadXml(xml.data(), xml.size(), "r.xml"));
+    const UVRect& part = loader.Desc(loader.Images()[0])->Parts()[0];
+    EXPECT_FLOAT_EQ(part.u2, 2147483648.0f / 64) << "the far edge does not wrap around";
+    EXPECT_FLOAT_EQ(part.v2, -4294967294.0f / 32);
+}
+
 TEST(TextureDeclarations, BadDumpsAreRefusedWithoutFallingBackToXml)
 {
     GameFolder game;

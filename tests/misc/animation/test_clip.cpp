@@ -64,6 +64,8 @@ struct ClipFixture : ::testing::Test {
     std::unique_ptr<ox::core::CTimeManager> time;
     RecordingSounds sounds;
     CClipsLoader loader;
+    // Made before the surface and so gone after it: the surface's device texture goes back to it.
+    std::unique_ptr<ox::graphics::CRenderer> renderer;
     ox::graphics::CSurface surface {32, 32};
     ox::graphics::CTexture texture {&surface};
 
@@ -255,7 +257,7 @@ TEST_F(ClipFixture, NestedClipRunsItsOwnTimeLineInsideTheOuterOne)
     EXPECT_EQ(view.GetClip().GetSize(), FloatVector(40, 40));
 
     oxtest::RecordingBackend* backend = nullptr;
-    auto renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, 1024, 768);
+    renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, 1024, 768);
     ASSERT_TRUE(renderer->BeginScene());
     clip.Draw(renderer.get());
     renderer->Flush();
@@ -281,7 +283,7 @@ TEST_F(ClipFixture, DrawPlacesColoursFlipsAndClipsToTheRectangle)
     clip.SetPos({200, 200});
     clip.SetColor(Color(0xFF808080u));
     oxtest::RecordingBackend* backend = nullptr;
-    auto renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, 1024, 768);
+    renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, 1024, 768);
     ASSERT_TRUE(renderer->BeginScene());
     clip.Draw(renderer.get());
     renderer->Flush();
@@ -334,7 +336,7 @@ TEST_F(ClipFixture, ObjectsThatCannotBeUsedAreLoggedAndLeftOut)
     EXPECT_FALSE(clip.Load(loader, "missing"));
 
     oxtest::RecordingBackend* backend = nullptr;
-    auto renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, 1024, 768);
+    renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, 1024, 768);
     ASSERT_TRUE(renderer->BeginScene());
     clip.Update();
     clip.Draw(renderer.get());
