@@ -198,7 +198,7 @@ void CSceneGroup::Load(const CSettingsGroup& element, bool brief)
     CBaseSceneObject::Load(element, brief);
     const CBaseSceneObject* last = m_Childs.empty() ? nullptr : m_Childs.back().get();
     for (const auto& child : element.GetChildren()) {
-        BaseSceneObjectPtrT state(LoadSceneChild_(child.get(), brief));
+        BaseSceneObjectPtrT state(LoadSceneChild_(child.get(), brief), false);
         if (!state)
             continue;
         InsertChild(state, last);
@@ -270,7 +270,7 @@ void CScene::Load(const CSettingsGroup& element, bool brief)
     const CBaseSceneObject* last = nullptr;
     if (const CSettingsGroup* objects = element.GetChildRef("objects"))
         for (const auto& child : objects->GetChildren()) {
-            BaseSceneObjectPtrT object(LoadSceneChild_(child.get(), brief));
+            BaseSceneObjectPtrT object(LoadSceneChild_(child.get(), brief), false);
             if (!object)
                 continue;
             InsertObject(object, last);

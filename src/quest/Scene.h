@@ -103,8 +103,9 @@ private:
     CLevel* m_ParentLevel = nullptr;
 };
 
-// A new object (reference count 0) from an element of a scene's `objects`: `object` of type
-// image or clip, or `group`; null for anything else or a value that does not read (logged).
+// A new object from an element of a scene's `objects`: `object` of type image or clip, or
+// `group`; null for anything else or a value that does not read (logged). The caller adopts
+// the one reference it holds (`BaseSceneObjectPtrT(object, false)`).
 CBaseSceneObject* LoadSceneChild_(const ox::core::CSettingsGroup* element, bool brief);
 
 } // namespace qe
