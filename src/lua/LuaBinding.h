@@ -13,5 +13,8 @@ mluabind::Namespace BindFileWatcher();
 // "core": CGroupTimer (GetTime, Pause, IsPaused, AttachGroupTimer, GetChildGroupTimer) and
 // GetRootGroupTimer, the root of the time tree: what scripts need to give their threads a clock.
 mluabind::Namespace BindGroupTimers();
+// "std": the maths helpers abs, acos, asin, atan, atan2, atof, ceil, cos, cosh, exp, floor,
+// log, log10, pow, rand, sin, sinh, sqrt, srand, tan and tanh.
+mluabind::Namespace BindStdMaths();
 
 } // namespace ox::lua
