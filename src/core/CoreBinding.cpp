@@ -155,10 +155,12 @@ mluabind::i::GenericClass& TimerWrapperClass(const char* name)
 
 CGroupTimer* GetRootGroupTimer() { return GetTimeManager().GetRoot(); }
 
-mluabind::Namespace TimeClasses()
+} // namespace
+
+mluabind::Namespace BindTimers()
 {
     using M = CTimeManager;
-    mluabind::Namespace ns;
+    mluabind::Namespace ns("core");
     ns.AddClass(TimerClass<CTimer>("CTimer"));
     ns.AddClass(TimerClass<CGroupTimer>("CGroupTimer")
                     .Method("GetId", &CGroupTimer::GetId)
@@ -181,19 +183,17 @@ mluabind::Namespace TimeClasses()
     return ns;
 }
 
-} // namespace
-
 void BindCore(mluabind::CHost& host)
 {
     mluabind::Namespace core("core");
     core.AddClass(ApplicationClass());
-    core.Merge(ManagerClasses()).Merge(SettingsClasses()).Merge(TimeClasses());
+    core.Merge(ManagerClasses()).Merge(SettingsClasses());
     for (auto [name, value] : {std::pair{"OX_Unknown", OX_Unknown}, {"OX_Windows", OX_Windows},
                                {"OX_MacOSX", OX_MacOSX}, {"OX_iPhone", OX_iPhone}})
         core.AddConstant(Constant(name, static_cast<int>(value)));
     core.AddConstant(Constant("g_Application", g_Application));
     core.AddConstant(Constant("g_OXPlatform", static_cast<int>(OX_Windows)));
-    host.Bind(mluabind::Namespace("ox").Merge(core));
+    host.Bind(mluabind::Namespace("ox").Merge(core).Merge(BindTimers()));
     // Also globals of every state that has the framework's names.
     host.Bind(mluabind::Namespace()
                   .AddConstant(Constant("g_Application", g_Application))

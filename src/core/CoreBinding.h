@@ -9,4 +9,9 @@ namespace ox::core {
 // Binds in declaration mode (the caller brackets it with BeginBinding and EndBinding).
 void BindCore(mluabind::CHost& host);
 
+// "core": the timers and their wrappers, the time manager and GetRootGroupTimer, the root of
+// the time tree (what script threads take their clocks from). Part of BindCore; run in
+// declaration mode and merge under "ox".
+mluabind::Namespace BindTimers();
+
 } // namespace ox::core

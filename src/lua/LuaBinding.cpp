@@ -2,7 +2,7 @@
 
 #include "lua/Lua.h"
 #include "lua/mluabind/StdBinding.h"
-#include "core/TimeManager.h"
+#include "core/CoreBinding.h"
 #include "misc/FileWatcher.h"
 
 #include <cmath>
@@ -43,26 +43,7 @@ mluabind::Namespace BindFileWatcher()
     return ns;
 }
 
-namespace {
-
-core::CGroupTimer* GetRootGroupTimer() { return core::GetTimeManager().GetRoot(); }
-
-} // namespace
-
-mluabind::Namespace BindGroupTimers()
-{
-    using core::CGroupTimer;
-    using mluabind::Class;
-    mluabind::Namespace ns("core");
-    ns.AddClass(Class<CGroupTimer>("CGroupTimer")
-                    .Method("GetTime", &CGroupTimer::GetTime)
-                    .Method("Pause", &CGroupTimer::Pause)
-                    .Method("IsPaused", &CGroupTimer::IsPaused)
-                    .Method("AttachGroupTimer", &CGroupTimer::AttachGroupTimer)
-                    .Method("GetChildGroupTimer", &CGroupTimer::GetChildGroupTimer));
-    ns.AddFunction(mluabind::Function("GetRootGroupTimer", &GetRootGroupTimer));
-    return ns;
-}
+mluabind::Namespace BindGroupTimers() { return core::BindTimers(); }
 
 mluabind::Namespace BindStdMaths()
 {

@@ -176,6 +176,17 @@ TEST_F(VocabularyTest, GeometryHelpersAnswerAsTheQuadsAndMatricesSay)
                   " local d = m.Poly4FromRect(m.FloatRect(20, 0, 5, 5))"
                   " return tostring(a.IsIntersects(b)) .. tostring(a.IsIntersects(c)) .. tostring(a.IsIntersects(d))"),
               "truetruefalse");
+    // A location at (10, 0) with the contour of a 2 by 2 square: its corner (1, 1) of the unit
+    // square lies at (12, 2) and back; the quad turned by a quarter is bounded by (-2, 0) 2 by 2.
+    EXPECT_EQ(Run("local m = ox.misc local l = m.Location() l.Pos = m.FloatVector(10, 0)"
+                  " l.Contour = m.Poly4FromRect(m.FloatRect(0, 0, 2, 2)) local a = l.GetAbsPos(m.FloatVector(1, 1))"
+                  " local b = l.GetPolyPos(a) return a.X .. ',' .. a.Y .. ' ' .. b.X .. ',' .. b.Y .. ' ' .."
+                  " tostring(l.IsContains(m.FloatVector(11, 1))) .. tostring(l.IsContains(m.FloatVector(1, 1)))"),
+              "12,2 1,1 truefalse");
+    EXPECT_EQ(Run("local m = ox.misc local l = m.Location() l.Contour = m.Poly4FromRect(m.FloatRect(0, 0, 2, 2))"
+                  " l.Angle = math.pi / 2 local r = l.GetPoly().GetBoundingRect()"
+                  " return string.format('%.0f,%.0f,%.0f,%.0f', r.X, math.abs(r.Y), r.Width, r.Height)"),
+              "-2,0,2,2");
 }
 
 TEST_F(VocabularyTest, TextNumbersAndLogReachTheirServices)
