@@ -3,6 +3,8 @@
 #include "diag/Log.h"
 #include "diag/Message.h"
 
+#include <string>
+
 namespace ox::diag {
 
 namespace {
@@ -10,16 +12,28 @@ namespace {
 using mluabind::Constant;
 using mluabind::Function;
 
-// A script's text goes to the log as it is: a '%' in it is no format for arguments the
-// script never gave.
+// A script's text is a format with no arguments: "%%" gives "%", as a formatter makes it. A
+// conversion that would read an argument the script never gave stays as it is written.
+template <class Ch>
+std::basic_string<Ch> ZeroArgumentFormat(const Ch* text)
+{
+    std::basic_string<Ch> out;
+    for (const Ch* p = text; p && *p; ++p) {
+        out += *p;
+        if (p[0] == '%' && p[1] == '%')
+            ++p;
+    }
+    return out;
+}
+
 void LogA(const char* channel, int level, const char* text)
 {
-    Log::Instance().Write(channel ? channel : "", level, "%s", text ? text : "");
+    Log::Instance().Write(channel ? channel : "", level, "%s", ZeroArgumentFormat(text).c_str());
 }
 
 void LogW(const char* channel, int level, const wchar* text)
 {
-    Log::Instance().Write(channel ? channel : "", level, u"%s", text ? text : u"");
+    Log::Instance().Write(channel ? channel : "", level, u"%s", ZeroArgumentFormat(text).c_str());
 }
 
 mluabind::Namespace MessageFunctions()

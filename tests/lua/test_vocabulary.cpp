@@ -198,8 +198,9 @@ TEST_F(VocabularyTest, TextNumbersAndLogReachTheirServices)
     EXPECT_EQ(Run("local c = ox.graphics.Color(0x80FF2000) return c.Red .. ',' .. c.Green .. ',' .. c.Alpha"),
               "255,32,128");
     EXPECT_EQ(Run("return ox.misc.StringA24('lamp').c_str()"), "lamp");
-    Run("ox.diag.LogA('vocab', ox.diag.LogInfo, 'a line at 100%s')");
-    EXPECT_TRUE(log.Contains("a line at 100%s"));
+    Run("ox.diag.LogA('vocab', ox.diag.LogInfo, 'at 100%% of %s') ox.diag.LogW('vocab', ox.diag.LogError, 'wide %d%%')");
+    EXPECT_TRUE(log.Contains("[vocab][1]: at 100% of %s"));
+    EXPECT_TRUE(log.Contains("[vocab][3]: wide %d%"));
     // Arguments no overload takes: the report, nil, and the script goes on.
     EXPECT_EQ(Run("return ox.misc.MatrixRotation('x', 'y', 'z') == nil"), "true");
     ASSERT_FALSE(boxes.Boxes().empty());
