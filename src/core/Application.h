@@ -15,6 +15,10 @@
 #include <functional>
 #include <memory>
 
+namespace mluabind {
+class CHost;
+}
+
 namespace ox::core {
 
 enum AppState : uint32_t { Created = 0, Loading = 1, LoadingPaused = 2, Running = 3, ShuttingDown = 4 };
@@ -46,6 +50,9 @@ public:
     virtual void DoDraw(graphics::CRenderer* renderer);
     virtual void DoUpdate() {}
     virtual void DoLoad();
+    // The project's own script names, bound by the framework's vocabulary after its own
+    // (in declaration mode).
+    virtual void BindScript(mluabind::CHost& /*host*/) {}
 
     void Update() override;
     void Draw() override;

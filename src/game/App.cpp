@@ -1,6 +1,7 @@
 #include "game/App.h"
 
 #include "core/FontManager.h"
+#include "core/ScriptVocabulary.h"
 #include "core/SettingsReaders.h"
 #include "core/TextureDeclarations.h"
 #include "core/TextureManager.h"
@@ -115,11 +116,10 @@ void CApp::CloseOutput()
     m_OutputRedirected = false;
 }
 
-// The script vocabulary that exists so far: std strings, the Lua host, the file watcher and
-// the audio manager and the GUI's windows and widgets, then the quest tree.
+// The framework's script vocabulary, then the quest tree.
 void CApp::BindScripts()
 {
-    qe::BindFramework(*m_Lua);
+    core::BindOX(*m_Lua);
     m_Lua->BeginBinding();
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();

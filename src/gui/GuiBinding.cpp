@@ -256,4 +256,36 @@ mluabind::Namespace BindGui()
     return ns;
 }
 
+// --- the whole GUI vocabulary, for the framework's roof list ---
+
+namespace {
+
+template <class T>
+mluabind::i::GenericClass& InsetsClass(const char* name)
+{
+    using I = misc::Insets<T>;
+    return Class<I>(name)
+        .template Constructor<>()
+        .template Constructor<T, T, T, T>()
+        .Member("Left", &I::Left)
+        .Member("Right", &I::Right)
+        .Member("Top", &I::Top)
+        .Member("Bottom", &I::Bottom);
+}
+
+} // namespace
+
+void BindGuiVocabulary(mluabind::CHost& host)
+{
+    using WidgetsT = CBaseWidget::WidgetsT;
+    using Widget = WidgetsT::value_type;
+    mluabind::Namespace ns = BindGui();
+    ns.AddClass(InsetsClass<int>("IntInsets"));
+    ns.AddClass(InsetsClass<float>("FloatInsets"));
+    ns.AddClass(mluabind::i::IteratorClass<WidgetsT::iterator, Widget, true, true>("CBaseWidget.WidgetIteratorT"));
+    ns.AddClass(mluabind::i::IteratorClass<WidgetsT::const_iterator, const Widget, true, false>(
+        "CBaseWidget.ConstWidgetIteratorT"));
+    host.Bind(mluabind::Namespace("ox").Merge(ns));
+}
+
 } // namespace ox::gui

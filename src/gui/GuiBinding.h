@@ -11,4 +11,9 @@ namespace ox::gui {
 // move a script-made window into the GUI's keeping.
 mluabind::Namespace BindGui();
 
+// The GUI's whole vocabulary under "ox.gui": BindGui's names, the insets IntInsets and
+// FloatInsets and the walks CBaseWidget.WidgetIteratorT and ConstWidgetIteratorT. Binds in
+// declaration mode.
+void BindGuiVocabulary(mluabind::CHost& host);
+
 } // namespace ox::gui

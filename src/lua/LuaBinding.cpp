@@ -2,8 +2,12 @@
 
 #include "lua/Lua.h"
 #include "lua/mluabind/StdBinding.h"
-#include "core/TimeManager.h"
+#include "core/CoreBinding.h"
 #include "misc/FileWatcher.h"
+
+#include <cmath>
+#include <cstdlib>
+#include <utility>
 
 namespace ox::lua {
 
@@ -39,24 +43,39 @@ mluabind::Namespace BindFileWatcher()
     return ns;
 }
 
-namespace {
+mluabind::Namespace BindGroupTimers() { return core::BindTimers(); }
 
-core::CGroupTimer* GetRootGroupTimer() { return core::GetTimeManager().GetRoot(); }
-
-} // namespace
-
-mluabind::Namespace BindGroupTimers()
+mluabind::Namespace BindStdMaths()
 {
-    using core::CGroupTimer;
-    using mluabind::Class;
-    mluabind::Namespace ns("core");
-    ns.AddClass(Class<CGroupTimer>("CGroupTimer")
-                    .Method("GetTime", &CGroupTimer::GetTime)
-                    .Method("Pause", &CGroupTimer::Pause)
-                    .Method("IsPaused", &CGroupTimer::IsPaused)
-                    .Method("AttachGroupTimer", &CGroupTimer::AttachGroupTimer)
-                    .Method("GetChildGroupTimer", &CGroupTimer::GetChildGroupTimer));
-    ns.AddFunction(mluabind::Function("GetRootGroupTimer", &GetRootGroupTimer));
+    using mluabind::Function;
+    using F = double (*)(double);
+    mluabind::Namespace ns("std");
+    // Lambdas, not the addresses of library functions, which need not be addressable.
+    const std::pair<const char*, F> unary[] = {
+        {"abs", [](double x) { return std::fabs(x); }},
+        {"acos", [](double x) { return std::acos(x); }},
+        {"asin", [](double x) { return std::asin(x); }},
+        {"atan", [](double x) { return std::atan(x); }},
+        {"ceil", [](double x) { return std::ceil(x); }},
+        {"cos", [](double x) { return std::cos(x); }},
+        {"cosh", [](double x) { return std::cosh(x); }},
+        {"exp", [](double x) { return std::exp(x); }},
+        {"floor", [](double x) { return std::floor(x); }},
+        {"log", [](double x) { return std::log(x); }},
+        {"log10", [](double x) { return std::log10(x); }},
+        {"sin", [](double x) { return std::sin(x); }},
+        {"sinh", [](double x) { return std::sinh(x); }},
+        {"sqrt", [](double x) { return std::sqrt(x); }},
+        {"tan", [](double x) { return std::tan(x); }},
+        {"tanh", [](double x) { return std::tanh(x); }},
+    };
+    for (auto [name, f] : unary)
+        ns.AddFunction(Function(name, f));
+    ns.AddFunction(Function("atan2", [](double y, double x) { return std::atan2(y, x); }));
+    ns.AddFunction(Function("pow", [](double x, double y) { return std::pow(x, y); }));
+    ns.AddFunction(Function("atof", [](const char* text) { return text ? std::atof(text) : 0.0; }));
+    ns.AddFunction(Function("rand", [] { return std::rand(); }));
+    ns.AddFunction(Function("srand", [](unsigned seed) { std::srand(seed); }));
     return ns;
 }
 

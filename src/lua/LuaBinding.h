@@ -10,8 +10,11 @@ namespace ox::lua {
 mluabind::Namespace BindLuaClasses();
 // "misc": CFileWatcher and its list of names, CFileWatcher.FileNamesT.
 mluabind::Namespace BindFileWatcher();
-// "core": CGroupTimer (GetTime, Pause, IsPaused, AttachGroupTimer, GetChildGroupTimer) and
-// GetRootGroupTimer, the root of the time tree: what scripts need to give their threads a clock.
+// "core": the timers and GetRootGroupTimer, for hosts that take only part of the framework
+// (the same as ox::core::BindTimers).
 mluabind::Namespace BindGroupTimers();
+// "std": the maths helpers abs, acos, asin, atan, atan2, atof, ceil, cos, cosh, exp, floor,
+// log, log10, pow, rand, sin, sinh, sqrt, srand, tan and tanh.
+mluabind::Namespace BindStdMaths();
 
 } // namespace ox::lua

@@ -1,6 +1,7 @@
 #include "quest/QuestBinding.h"
 
 #include "graphics/Renderer.h"
+#include "core/ScriptVocabulary.h"
 #include "core/Settings.h"
 #include "core/TimeManager.h"
 #include "diag/Assert.h"
@@ -288,15 +289,7 @@ mluabind::Namespace BindQuestClasses()
 
 void BindFramework(mluabind::CHost& host)
 {
-    host.BeginBinding();
-    host.Bind(mluabind::BindStdStrings());
-    host.Bind(mluabind::Namespace("ox")
-                  .Merge(ox::sound::BindAudioManager())
-                  .Merge(ox::lua::BindFileWatcher())
-                  .Merge(ox::lua::BindLuaClasses())
-                  .Merge(ox::lua::BindGroupTimers())
-                  .Merge(ox::gui::BindGui()));
-    host.EndBinding();
+    ox::core::BindOX(host);
 }
 
 int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, const std::string& a,

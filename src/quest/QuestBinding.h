@@ -31,9 +31,8 @@ class CLevel;
 // table CSceneWidget with ClearScriptCache.
 mluabind::Namespace BindQuestClasses();
 
-// The framework's vocabulary, which the quest classes build on: std strings and "ox" (audio
-// manager, file watcher, Lua hosts, group timers, windows and widgets). Binds in declaration
-// mode on its own.
+// The framework's vocabulary, which the quest classes build on (ox.lua.BindOX). Binds in
+// declaration mode on its own.
 void BindFramework(mluabind::CHost& host);
 
 // Starts a level in its Lua host (the one listed as qe_level): binds the framework's

@@ -41,4 +41,20 @@ mluabind::Namespace BindAudioManager()
     return ns;
 }
 
+void BindSound(mluabind::CHost& host)
+{
+    host.Bind(mluabind::Namespace("ox").Merge(BindAudioManager()));
+    // "ox" stands: the audio manager was just bound under it.
+    lua_State* L = host.GetLuaState();
+    lua_getglobal(L, "ox");
+    lua_getfield(L, -1, "sound");
+    const bool missing = lua_isnil(L, -1);
+    lua_pop(L, 1);
+    if (missing) {
+        lua_newtable(L);
+        lua_setfield(L, -2, "sound");
+    }
+    lua_pop(L, 1);
+}
+
 } // namespace ox::sound

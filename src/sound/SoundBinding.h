@@ -12,4 +12,8 @@ namespace ox::sound {
 // UnloadAllOnDemandSounds; ids and groups are strings, handles numbers.
 mluabind::Namespace BindAudioManager();
 
+// The audio vocabulary: ox.core.CAudioManager and the sound namespace ox.sound, a table with
+// no names of its own. Binds in declaration mode.
+void BindSound(mluabind::CHost& host);
+
 } // namespace ox::sound

@@ -122,3 +122,6 @@ function quest.OnClose()
     qe.g_LuaThreadManager.Instance().Clear()
     qe.CSceneWidget.ClearScriptCache()
 end
+
+-- What the engine offers scripts, walked once loading is complete (after Run).
+ox.lua.CLua.GetLua("main").LoadScript("scripts/engine_tour.lua")
