@@ -121,6 +121,12 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
                                              "Lantern Demo: the level starts", "Lantern Demo: the lamp click script runs",
                                              "Lantern Demo: qe.StartLevel gave 1"}))
         << run.Output();
+    // The engine tour asks the engine's own services: a declared texture's size, a font's
+    // measure, the audio manager's group volume.
+    EXPECT_TRUE(run.WaitForOutput("the disc is 96 px wide", std::chrono::seconds(5))) << run.Output();
+    EXPECT_TRUE(LogHasInOrder(run.Output(), {"Lantern Demo tour: ", " px in the font small, show_fps ",
+                                             ", music at volume "}))
+        << run.Output();
 
     // Editing the main script while the game runs runs it again in the same state: what
     // Init stored is still there.
