@@ -5,7 +5,11 @@
 #include "core/TextureDeclarations.h"
 #include "core/TextureManager.h"
 #include "diag/Log.h"
+#include "game/GameBinding.h"
+#include "game/GameOptions.h"
 #include "game/LoadWindow.h"
+#include "game/Profile.h"
+#include "game/RecordTable.h"
 #include "gui/Cursor.h"
 #include "lua/LuaHeap.h"
 #include "graphics/Font.h"
@@ -121,6 +125,8 @@ void CApp::BindScripts()
 {
     qe::BindFramework(*m_Lua);
     m_Lua->BeginBinding();
+    m_Lua->Bind(BindGameClasses());
+    m_Lua->Bind(BindGameGlobals());
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
@@ -128,8 +134,7 @@ void CApp::BindScripts()
 bool CApp::Init()
 {
     // Later subsystems join the start here, in this order: the framework's, the game's and
-    // the quest engine's script vocabularies with the main script host; after the window the
-    // player's options, profiles, music and records before scripts/main.lua; after show_fps
+    // the quest engine's script vocabularies with the main script host; after show_fps
     // the particle declarations, before the clips; after the textures the sound declarations;
     // after the fonts the quest data and the edit widget's forbidden characters.
     lua::SetLuaHeapSize(0x1400000);
@@ -158,8 +163,7 @@ bool CApp::Init()
         misc::sys::SetNamedFullAccess(saves, false);
 
     m_Renderer.SetSourceResolution(kSourceWidth, kSourceHeight);
-    // The window opens at the source size until the player's options choose the mode.
-    ChangeScreenMode(false, true, kSourceWidth, kSourceHeight);
+    LoadPlayerFiles(saves);
     m_Demo = std::make_unique<CDemoScene>(m_Renderer);
 
     m_Lua->LoadScript("scripts/main.lua");
@@ -197,6 +201,23 @@ bool CApp::Init()
     gui::CBaseWidget::SetDebugRender(core::ReadBool(settings, "debug_render"));
     m_Demo->LoadPanel(m_Settings.GetChild("gui"), m_Settings.GetChild("GUITemplates"));
     return true;
+}
+
+// The player's options and profiles; the options of the current profile open the window in
+// the saved mode and set the volumes. Then the records.
+void CApp::LoadPlayerFiles(const wstring& saves)
+{
+    CGameOptions& options = g_GameOptions::Instance();
+    CProfileManager& profiles = g_ProfileManager::Instance();
+    profiles.SetSavesFolder(saves);
+    options.SetFolder(saves);
+    options.Load();
+    profiles.Load();
+    options.ApplyOptionsChanges();
+    options.ApplyMusicChanges();
+    CRecordTable& records = g_RecordTable::Instance();
+    records.SetFolder(saves);
+    records.Load();
 }
 
 gui::BaseWindowPtrT CApp::CreateLoadWindow()
