@@ -188,6 +188,9 @@ void BindGameInto(ox::lua::CLua* lua)
 {
     OX_CHECK_DATA(lua != nullptr);
     lua->BeginBinding();
+    // Names and GUIDs travel as std strings.
+    if (!lua->FindClass(typeid(ox::wstring)))
+        lua->Bind(mluabind::BindStdStrings());
     mluabind::Namespace ns("k17");
     if (!lua->FindClass(typeid(CProfile)))
         ns.Merge(ProfileNames());

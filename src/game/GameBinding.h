@@ -22,7 +22,7 @@ mluabind::Namespace BindGameGlobals();
 // What __QEBindGame binds into `lua`: the profile classes and manager, the options' free
 // functions k17.GetDificultyLevel, SetDificultyLevel, GetSoundVolume and GetMusicVolume (the
 // volumes as integers) and k17.CGameOptions with its constants only. A state that has the
-// classes already keeps them.
+// classes already keeps them; one without the std strings gets them.
 void BindGameInto(ox::lua::CLua* lua);
 
 } // namespace k17

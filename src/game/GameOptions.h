@@ -72,7 +72,7 @@ public:
 
     bool GetFullScreenMode() const { return m_ScreenMode.FullScreen; }
     void SetFullScreenMode(bool value) { m_ScreenMode.FullScreen = value; }
-    const ScreenMode& GetScreenMode() const { return m_ScreenMode; }
+    ScreenMode GetScreenMode() const { return m_ScreenMode; }
     void SetScreenMode(const ScreenMode& mode) { m_ScreenMode = mode; }
     float GetBrightness() const { return m_Current.m_Brightness; }
     void SetBrightness(float value) { m_Current.m_Brightness = value; }
