@@ -5,6 +5,7 @@
 #include "core/TextureDeclarations.h"
 #include "core/TextureManager.h"
 #include "diag/Log.h"
+#include "game/DemoShell.h"
 #include "game/GameBinding.h"
 #include "game/GameOptions.h"
 #include "game/LoadWindow.h"
@@ -127,6 +128,7 @@ void CApp::BindScripts()
     m_Lua->BeginBinding();
     m_Lua->Bind(BindGameClasses());
     m_Lua->Bind(BindGameGlobals());
+    m_Lua->Bind(BindDemoShell());
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
@@ -164,6 +166,7 @@ bool CApp::Init()
 
     m_Renderer.SetSourceResolution(kSourceWidth, kSourceHeight);
     LoadPlayerFiles(saves);
+    RegisterDemoShellWidgets();
     m_Demo = std::make_unique<CDemoScene>(m_Renderer);
 
     m_Lua->LoadScript("scripts/main.lua");

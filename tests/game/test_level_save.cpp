@@ -1,17 +1,25 @@
-// A level's brief state goes into the profile's save file and comes back: the pieces a game's
-// scripts save and restore a level with.
-#include "core/Settings.h"
+// A level's brief state goes into the profile's save file and comes back onto a level fresh
+// from the quest data.
+#include "game/LevelState.h"
 #include "game/Profile.h"
 #include "misc/Unicode.h"
-#include "misc/XmlWriter.h"
 #include "quest/ImageObject.h"
 #include "quest/Level.h"
+#include "quest/SceneGroup.h"
 #include "support/TestSupport.h"
 
 using namespace qe;
 
 namespace {
 
+BaseSceneObjectPtrT Image(const char* id)
+{
+    BaseSceneObjectPtrT image(new CImageObject());
+    image->SetId(id);
+    return image;
+}
+
+// level1: scene main with a key and a lamp group of the states off and on.
 LevelPtrT MakeLevel()
 {
     LevelPtrT level(new CLevel());
@@ -19,47 +27,43 @@ LevelPtrT MakeLevel()
     ScenePtrT scene(new CScene());
     scene->SetId("main");
     level->InsertScene(scene, nullptr);
-    for (const char* id : {"key", "lamp"}) {
-        BaseSceneObjectPtrT image(new CImageObject());
-        image->SetId(id);
-        scene->InsertObject(image, scene->Objects().empty() ? nullptr : scene->Objects().back().get());
-    }
+    SceneGroupPtrT lamp(new CSceneGroup());
+    lamp->SetId("lamp");
+    lamp->InsertChild(Image("off"), nullptr);
+    lamp->InsertChild(Image("on"), lamp->Childs().front().get());
+    scene->InsertObject(Image("key"), nullptr);
+    scene->InsertObject(lamp, scene->Objects().front().get());
     scene->UpdateTotalChildList();
     return level;
 }
 
 } // namespace
 
-TEST(LevelSave, BriefStateWrittenToTheSaveFileRestoresAFreshLevel)
+TEST(LevelSave, BriefStateInTheSaveFileRestoresAFreshLevel)
 {
     oxtest::TempDir dir;
+    oxtest::LogCapture log;
     k17::CProfileManager profiles;
     profiles.SetSavesFolder(ox::misc::Utf8ToWide(dir.Path().string()));
-    k17::CProfile* player = profiles.CreateProfile(u"Ann", true);
+    const ox::wstring save = profiles.CreateProfile(u"Ann", true)->GetSaveFileName();
+
+    LevelPtrT fresh = MakeLevel();
+    EXPECT_FALSE(k17::RestoreLevelState(fresh.get(), save)) << "no save yet";
 
     LevelPtrT played = MakeLevel();
     played->FindObjectById("key", true, true)->SetObjectFlags(CBaseSceneObject::ObjectFlagRemoved);
-    played->FindObjectById("lamp", true, true)->SetHint("$7");
-    ox::misc::CXmlWriter writer(true);
-    {
-        ox::misc::CXmlElement root(writer, "save");
-        played->Save(root, true);
-    }
-    writer.SaveToFile(player->GetSaveFileName());
+    played->FindObjectById("off", true, true)->SetObjectFlags(CBaseSceneObject::ObjectFlagHidden);
+    played->FindObjectById("on", true, true)->SetHint("$7");
+    played->FindObjectById("on", true, true)->SetColor(ox::graphics::Color(0x80FF0000u));
+    ASSERT_TRUE(k17::SaveLevelState(played.get(), save));
 
-    ox::core::CSettings settings;
-    ASSERT_TRUE(settings.LoadXmlDirect(player->GetSaveFileName()));
-    LevelPtrT saved(new CLevel());
-    saved->Load(settings.GetChild("save").GetChild("level"), true);
-    LevelPtrT fresh = MakeLevel();
-    for (const char* id : {"key", "lamp"}) {
-        const CBaseSceneObject* from = saved->FindObjectById(id, true, true);
-        ASSERT_NE(from, nullptr) << id;
-        CBaseSceneObject* to = fresh->FindObjectById(id, true, true);
-        to->SetObjectFlags(from->GetObjectFlags());
-        to->SetHint(from->GetHint());
-    }
-    EXPECT_EQ(fresh->FindObjectById("key", true, true)->GetObjectFlags(), uint32_t(CBaseSceneObject::ObjectFlagRemoved));
-    EXPECT_EQ(fresh->FindObjectById("key", true, false), nullptr);
-    EXPECT_EQ(fresh->FindObjectById("lamp", true, true)->GetHint(), "$7");
+    ASSERT_TRUE(k17::RestoreLevelState(fresh.get(), save));
+    EXPECT_EQ(fresh->FindObjectById("key", true, false), nullptr) << "a taken object stays taken";
+    EXPECT_EQ(fresh->FindObjectById("off", true, true)->GetObjectFlags(), uint32_t(CBaseSceneObject::ObjectFlagHidden));
+    EXPECT_EQ(fresh->FindObjectById("on", true, true)->GetHint(), "$7");
+    EXPECT_EQ(fresh->FindObjectById("on", true, true)->GetColor(), ox::graphics::Color(0x80FF0000u));
+
+    fresh->SetId("level2");
+    EXPECT_FALSE(k17::RestoreLevelState(fresh.get(), save));
+    EXPECT_TRUE(log.Contains("holds no state of level level2"));
 }
