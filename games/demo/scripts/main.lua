@@ -122,3 +122,6 @@ function quest.OnClose()
     qe.g_LuaThreadManager.Instance().Clear()
     qe.CSceneWidget.ClearScriptCache()
 end
+
+-- Players, options and records.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/profiles.lua")
