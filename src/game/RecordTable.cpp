@@ -93,7 +93,11 @@ void CRecordTable::Load()
     if (ReadPlayerFile(settings, file, "Records")) {
         const CAttributeReader reader(file);
         const core::CSettingsGroup& root = settings.GetChild("Records");
-        reader.Read(root, "last_record_num", m_LastRecordPos);
+        if (reader.Read(root, "last_record_num", m_LastRecordPos) &&
+            (m_LastRecordPos < -1 || m_LastRecordPos == 0 || m_LastRecordPos > static_cast<int>(TableSize))) {
+            reader.Problem("last_record_num is no place of the table: none is marked");
+            m_LastRecordPos = -1;
+        }
         for (const core::SettingsGroupPtrT& node : root.GetChildren()) {
             if (node->GetId() != "record")
                 continue;

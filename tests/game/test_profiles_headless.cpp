@@ -52,8 +52,7 @@ TEST(DemoProfiles, ARestartContinuesWhereThePlayerLeft)
     const fs::path saves = data / "Lanternfold" / "Lantern Demo" / "saves";
     fs::copy(OX_DEMO_GAME, game, fs::copy_options::recursive);
 
-    // No player yet: the chooser opens.
-    EXPECT_NE(RunUntil(game, data, "chooser opens").find("Lantern Demo: the players' chooser opens"), std::string::npos);
+    EXPECT_NE(RunUntil(game, data, "nobody plays").find("Lantern Demo: nobody plays yet"), std::string::npos);
 
     std::ofstream(saves / "saves.xml") << "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
                                           "<Profiles current_profile_name=\"Ann\"><profile name=\"Ann\" guid=\"a1\"/></Profiles>\n";

@@ -86,6 +86,10 @@ TEST_F(Records, FileKeepsOrderAndShortTablesTakeNothingBelowTheirEnd)
     EXPECT_EQ(table.AddRecord(Player(u"Ann", "a"), 4), 1);
     EXPECT_TRUE(log.Contains("records.xml: <record> attribute score=\"lots\" is not a number"));
 
+    dir.Write("records.xml", kHead + "<Records last_record_num=\"99\"><record name=\"A\" score=\"1\"/></Records>");
+    table.Load();
+    EXPECT_EQ(table.GetLastRecordPos(), -1);
+
     dir.Write("records.xml", kHead + "<Records last_record_num=\"4\"/>");
     table.Load();
     EXPECT_EQ(table.Records().size(), 10u);

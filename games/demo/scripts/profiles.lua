@@ -1,8 +1,8 @@
 -- Lantern Demo: players, their options and the table of records. main.lua loads this file
--- last. At the start the player of the last session goes on where they left the level; with
--- no player yet the chooser opens (gui.xml, window "profiles"). In the first window P opens
--- the chooser, R the records and F ends the level now (a shortcut until the level can be
--- played to its end). The level's state goes into the player's save file when the game
+-- last. At the start the player of the last session goes on where they left the level. In
+-- the first window P opens the players' chooser (gui.xml,
+-- window "profiles"), R the records and F ends the level now (a shortcut until the level
+-- can be played to its end). The level's state goes into the player's save file when the game
 -- closes, when another player takes over and when the level ends.
 
 Profiles = Profiles or {}
@@ -20,13 +20,14 @@ local function manager() return k17.g_ProfileManager.Instance() end
 local function options() return k17.g_GameOptions.Instance() end
 local function records() return k17.g_RecordTable.Instance() end
 
--- The demo's sounds other than the music follow the player's sound volume.
+-- The player's volumes to the demo's groups: it has no voices, and its sounds other than the
+-- music have groups of their own, which follow the sound volume.
 local sound_groups = { "clicks", "windows", "found" }
 
 function Profiles.ApplyVolumes()
     local o = options()
-    o.ApplyMusicChanges()
     local audio = ox.core.CAudioManager.Instance()
+    audio.SetGroupVolume("music", o.GetMusicVolume())
     for _, group in ipairs(sound_groups) do
         audio.SetGroupVolume(group, o.GetSoundVolume())
     end
@@ -209,7 +210,7 @@ if Run ~= Profiles.run then
         if Profiles.Current() then
             Profiles.RestoreLevel()
         else
-            Profiles.OpenChooser()
+            print("Lantern Demo: nobody plays yet; P opens the players' chooser")
         end
     end
     Run = Profiles.run
