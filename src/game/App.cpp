@@ -210,7 +210,9 @@ bool CApp::Init()
 // the saved mode and set the volumes. Then the records.
 void CApp::LoadPlayerFiles(const wstring& saves)
 {
+    const core::CSettingsGroup& constants = m_Settings.GetChild("Constants");
     CGameOptions& options = g_GameOptions::Instance();
+    options.SetDefaults(constants);
     CProfileManager& profiles = g_ProfileManager::Instance();
     profiles.SetSavesFolder(saves);
     options.SetFolder(saves);
@@ -219,6 +221,7 @@ void CApp::LoadPlayerFiles(const wstring& saves)
     options.ApplyOptionsChanges();
     options.ApplyMusicChanges();
     CRecordTable& records = g_RecordTable::Instance();
+    records.SetDefaultName(core::ReadWString(constants.GetChild("records_window"), "def_player_name"));
     records.SetFolder(saves);
     records.Load();
 }

@@ -47,7 +47,6 @@ TEST(DemoProfilesScript, ChooserPlayersRecordsAndSaves)
     oxtest::TempDir dir;
     oxtest::MessageCapture boxes;
     const ox::wstring folder = ox::misc::Utf8ToWide(dir.Path().string());
-    g_GameOptions::Instance().SetTarget({});
     CProfileManager& profiles = g_ProfileManager::Instance();
     profiles.SetSavesFolder(folder);
     profiles.Load();

@@ -18,7 +18,6 @@ TEST(GameBinding, ScriptsReachProfilesOptionsAndRecords)
     oxtest::MessageCapture boxes;
     const ox::wstring folder = ox::misc::Utf8ToWide(dir.Path().string());
     CGameOptions& options = g_GameOptions::Instance();
-    options.SetTarget({});
     options.SetFolder(folder);
     options.Load();
     CProfileManager& profiles = g_ProfileManager::Instance();
