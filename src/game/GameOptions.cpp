@@ -190,6 +190,7 @@ void CGameOptions::Load()
                 reader.Problem("profile_options without a guid is left out");
                 continue;
             }
+            reader.WarnUnknown(*node, {"guid"});
             ProfileOptions options = DefaultsFor(guid);
             ReadOptions(reader, *node, options);
             m_Profiles[guid] = options;

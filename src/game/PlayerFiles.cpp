@@ -70,6 +70,18 @@ bool ReadPlayerFile(core::CSettings& settings, const wstring& path, const char* 
     return hasRoot;
 }
 
+void CAttributeReader::WarnUnknown(const core::CSettingsGroup& group, std::initializer_list<const char*> known) const
+{
+    for (unsigned i = 0; i < group.EnumAttributes(); ++i) {
+        const std::string name = group.GetAttribute(i).c_str();
+        bool listed = false;
+        for (const char* k : known)
+            listed = listed || name == k;
+        if (!listed)
+            Problem(("<" + std::string(group.GetId().c_str()) + "> has an unknown attribute " + name + ", ignored").c_str());
+    }
+}
+
 void CAttributeReader::Problem(const char* what) const
 {
     OX_LOG("data", diag::LogWarning, "%s: %s", misc::WideToUtf8(m_File).c_str(), what);

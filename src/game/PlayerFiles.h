@@ -6,6 +6,7 @@
 #include "core/Settings.h"
 #include "misc/WideChar.h"
 
+#include <initializer_list>
 #include <string>
 
 namespace ox::misc {
@@ -35,6 +36,9 @@ public:
     bool Read(const ox::core::CSettingsGroup& group, const char* name, ox::wstring& value) const;
     // A float that must lie in [low, high]: a value outside is logged and clamped.
     bool Read(const ox::core::CSettingsGroup& group, const char* name, float& value, float low, float high) const;
+
+    // Logs each attribute of `group` whose name is not among `known`; it is ignored.
+    void WarnUnknown(const ox::core::CSettingsGroup& group, std::initializer_list<const char*> known) const;
 
     // Logs a problem of the file's content on channel "data", naming the file.
     void Problem(const char* what) const;

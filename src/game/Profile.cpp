@@ -195,6 +195,7 @@ void CProfileManager::Load()
     for (const core::SettingsGroupPtrT& node : root.GetChildren())
         if (node->GetId() == "profile")
             LoadProfile(reader, *node);
+    reader.WarnUnknown(root, {"current_profile_name"});
     wstring current;
     reader.Read(root, "current_profile_name", current);
     SetCurrentProfile(current);
@@ -204,6 +205,8 @@ void CProfileManager::Load()
 
 void CProfileManager::LoadProfile(const CAttributeReader& reader, const core::CSettingsGroup& node)
 {
+    reader.WarnUnknown(node, {"name", "guid", "game_guid", "step", "points_count", "hints_count", "thermometer_points",
+                              "alpha_thermometer_points", "step_type", "level_state", "hints_use_count", "hints_use_flag"});
     wstring name;
     reader.Read(node, "name", name);
     if (name.empty()) {

@@ -93,6 +93,7 @@ void CRecordTable::Load()
     if (ReadPlayerFile(settings, file, "Records")) {
         const CAttributeReader reader(file);
         const core::CSettingsGroup& root = settings.GetChild("Records");
+        reader.WarnUnknown(root, {"last_record_num"});
         if (reader.Read(root, "last_record_num", m_LastRecordPos) &&
             (m_LastRecordPos < -1 || m_LastRecordPos == 0 || m_LastRecordPos > static_cast<int>(TableSize))) {
             reader.Problem("last_record_num is no place of the table: none is marked");
@@ -105,6 +106,7 @@ void CRecordTable::Load()
                 reader.Problem("more than ten records: the rest are left out");
                 break;
             }
+            reader.WarnUnknown(*node, {"name", "score", "game_guid"});
             RecordInfo record{m_DefaultName, 0, std::string()};
             reader.Read(*node, "name", record.Name);
             reader.Read(*node, "score", record.Score);

@@ -141,6 +141,7 @@ TEST_F(Profiles, HandEditedFileKeepsWhatThePlayerHad)
     EXPECT_EQ(manager->GetCurrentProfile(), nullptr);
     EXPECT_TRUE(log.Contains("saves.xml: <profile> attribute points_count=\"many\" is not a number"));
     EXPECT_TRUE(log.Contains("the current profile is not in the list"));
+    EXPECT_TRUE(log.Contains("saves.xml: <profile> has an unknown attribute colour, ignored"));
 }
 
 TEST_F(Profiles, DamagedFileIsKeptAsideAndWhatReadsIsUsed)

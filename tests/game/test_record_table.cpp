@@ -85,6 +85,7 @@ TEST_F(Records, FileKeepsOrderAndShortTablesTakeNothingBelowTheirEnd)
     EXPECT_EQ(table.AddRecord(Player(u"Ann", "a"), -1), -1);
     EXPECT_EQ(table.AddRecord(Player(u"Ann", "a"), 4), 1);
     EXPECT_TRUE(log.Contains("records.xml: <record> attribute score=\"lots\" is not a number"));
+    EXPECT_TRUE(log.Contains("records.xml: <record> has an unknown attribute extra, ignored"));
 
     dir.Write("records.xml", kHead + "<Records last_record_num=\"99\"><record name=\"A\" score=\"1\"/></Records>");
     table.Load();
