@@ -6,7 +6,12 @@
 #include "core/TextureDeclarations.h"
 #include "core/TextureManager.h"
 #include "diag/Log.h"
+#include "game/DemoShell.h"
+#include "game/GameBinding.h"
+#include "game/GameOptions.h"
 #include "game/LoadWindow.h"
+#include "game/Profile.h"
+#include "game/RecordTable.h"
 #include "gui/Cursor.h"
 #include "lua/LuaHeap.h"
 #include "graphics/Font.h"
@@ -116,11 +121,14 @@ void CApp::CloseOutput()
     m_OutputRedirected = false;
 }
 
-// The framework's script vocabulary, then the quest tree.
+// The framework's script vocabulary, then the game's and the quest tree.
 void CApp::BindScripts()
 {
     core::BindOX(*m_Lua);
     m_Lua->BeginBinding();
+    m_Lua->Bind(BindGameClasses());
+    m_Lua->Bind(BindGameGlobals());
+    m_Lua->Bind(BindDemoShell());
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
@@ -128,8 +136,7 @@ void CApp::BindScripts()
 bool CApp::Init()
 {
     // Later subsystems join the start here, in this order: the framework's, the game's and
-    // the quest engine's script vocabularies with the main script host; after the window the
-    // player's options, profiles, music and records before scripts/main.lua; after show_fps
+    // the quest engine's script vocabularies with the main script host; after show_fps
     // the particle declarations, before the clips; after the textures the sound declarations;
     // after the fonts the quest data and the edit widget's forbidden characters.
     lua::SetLuaHeapSize(0x1400000);
@@ -158,8 +165,8 @@ bool CApp::Init()
         misc::sys::SetNamedFullAccess(saves, false);
 
     m_Renderer.SetSourceResolution(kSourceWidth, kSourceHeight);
-    // The window opens at the source size until the player's options choose the mode.
-    ChangeScreenMode(false, true, kSourceWidth, kSourceHeight);
+    LoadPlayerFiles(saves);
+    RegisterDemoShellWidgets();
     m_Demo = std::make_unique<CDemoScene>(m_Renderer);
 
     m_Lua->LoadScript("scripts/main.lua");
@@ -197,6 +204,26 @@ bool CApp::Init()
     gui::CBaseWidget::SetDebugRender(core::ReadBool(settings, "debug_render"));
     m_Demo->LoadPanel(m_Settings.GetChild("gui"), m_Settings.GetChild("GUITemplates"));
     return true;
+}
+
+// The player's options and profiles; the options of the current profile open the window in
+// the saved mode and set the volumes. Then the records.
+void CApp::LoadPlayerFiles(const wstring& saves)
+{
+    const core::CSettingsGroup& constants = m_Settings.GetChild("Constants");
+    CGameOptions& options = g_GameOptions::Instance();
+    options.SetDefaults(constants);
+    CProfileManager& profiles = g_ProfileManager::Instance();
+    profiles.SetSavesFolder(saves);
+    options.SetFolder(saves);
+    options.Load();
+    profiles.Load();
+    options.ApplyOptionsChanges();
+    options.ApplyMusicChanges();
+    CRecordTable& records = g_RecordTable::Instance();
+    records.SetDefaultName(core::ReadWString(constants.GetChild("records_window"), "def_player_name"));
+    records.SetFolder(saves);
+    records.Load();
 }
 
 gui::BaseWindowPtrT CApp::CreateLoadWindow()

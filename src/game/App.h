@@ -48,6 +48,7 @@ private:
     void RedirectOutput();
     void CloseOutput();
     void BindScripts();
+    void LoadPlayerFiles(const ox::wstring& saves);
     // The frame-rate overlay, when the debug level and show_fps ask for it.
     void DrawFps(ox::graphics::CRenderer* renderer);
 

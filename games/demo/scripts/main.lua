@@ -123,5 +123,7 @@ function quest.OnClose()
     qe.CSceneWidget.ClearScriptCache()
 end
 
+-- Players, options and records.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/profiles.lua")
 -- What the engine offers scripts, walked once loading is complete (after Run).
 ox.lua.CLua.GetLua("main").LoadScript("scripts/engine_tour.lua")
