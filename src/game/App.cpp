@@ -7,6 +7,7 @@
 #include "diag/Log.h"
 #include "game/LoadWindow.h"
 #include "gui/Cursor.h"
+#include "gui/GuiServices.h"
 #include "lua/LuaHeap.h"
 #include "graphics/Font.h"
 #include "misc/Unicode.h"
@@ -85,6 +86,7 @@ CApp::~CApp()
 {
     m_Demo.reset();
     core::CFontManager::Instance().SetTextureLookup(nullptr);
+    gui::GetGuiServices().findFont = nullptr;
     misc::anim::GetClipServices() = misc::anim::ClipServices();
     CloseOutput();
     m_GameFolder.clear();
@@ -182,6 +184,10 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     });
     fonts.LoadGroup(m_ResourceDeclarations, nullptr);
+    // Labels and check boxes write with the declared fonts.
+    gui::GetGuiServices().findFont = [](const char* id) -> const graphics::CFont* {
+        return core::CFontManager::Instance().GetItem(id);
+    };
     // The quest: the pack's compiled form, or quest.xml compiled now. Levels are built from it
     // on demand, binding their textures and clips.
     qe::g_QuestData::Instance().Load();

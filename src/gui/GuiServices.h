@@ -11,6 +11,10 @@
 #include <functional>
 #include <string>
 
+namespace ox::graphics {
+struct CFont;
+}
+
 namespace ox::gui {
 
 struct GuiServices {
@@ -23,6 +27,8 @@ struct GuiServices {
     std::function<void(const std::string& id)> playSound;
     // A new effect of a registered name, or null for an unknown name.
     std::function<EffectPtrT(const wstring& name)> createEffect;
+    // A declared font by id, or null: what labels and check boxes write with.
+    std::function<const graphics::CFont*(const char* id)> findFont;
 };
 
 GuiServices& GetGuiServices();

@@ -122,3 +122,6 @@ function quest.OnClose()
     qe.g_LuaThreadManager.Instance().Clear()
     qe.CSceneWidget.ClearScriptCache()
 end
+
+-- The menus: the main menu, the options and the loading bar (they take Run over).
+ox.lua.CLua.GetLua("main").LoadScript("scripts/menu.lua")
