@@ -52,6 +52,7 @@ function Menu.Open(parent, id)
     window.SetColor(0x00FFFFFF)
     parent.AddChildWindow(window)
     window.AddEffect(ox.gui.CColorChangeEffect(0xFFFFFFFF, 400, 0, "main"))
+    say("\"" .. id .. "\" opens")
     return true
 end
 
