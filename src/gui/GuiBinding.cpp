@@ -7,6 +7,7 @@
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
 #include "gui/controls/ClipWidget.h"
+#include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
@@ -380,6 +381,7 @@ void BindControls(mluabind::Namespace& ns)
                     .Method("SetValue", &P::SetValue)
                     .Method("GetValue", &P::GetValue));
     ns.AddClass(Class<CToolbarWidget>("CToolbarWidget").BaseClass<CWidget>().Constructor<>());
+    ns.AddClass(Class<CImageBoxWidget>("CImageBoxWidget").BaseClass<CWidget>().Constructor<>());
     ns.AddClass(Class<CToolTipHelperWidget>("CToolTipHelperWidget")
                     .BaseClass<CWidget>()
                     .Method("StopShowToolTip", &CToolTipHelperWidget::StopShowToolTip));
@@ -391,6 +393,7 @@ void BindControls(mluabind::Namespace& ns)
     AddCast<CRadioButtonGroupWidget>(ns, "CRadioButtonGroupWidget.Cast");
     AddCast<CProgressBarWidget>(ns, "CProgressBarWidget.Cast");
     AddCast<CToolbarWidget>(ns, "CToolbarWidget.Cast");
+    AddCast<CImageBoxWidget>(ns, "CImageBoxWidget.Cast");
     AddCast<CWindow>(ns, "CWindow.Cast");
 }
 

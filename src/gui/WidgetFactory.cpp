@@ -4,6 +4,7 @@
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
 #include "gui/controls/ClipWidget.h"
+#include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
@@ -54,12 +55,13 @@ CWidgetFactory& GetWidgetFactory()
 
 void RegisterFrameworkWidgets(CWidgetFactory& factory)
 {
-    // In the framework's order. The scroll, list, combo box, edit, slider, tab, table, image
-    // box and tree widgets join at their places when their classes exist.
+    // In the framework's order. The scroll, list, combo box, edit, slider, tab, table and
+    // tree widgets join at their places when their classes exist.
     factory.RegisterWidget<CLabelWidget>("label_widget");
     factory.RegisterWidget<CImageWidget>("image_widget");
     factory.RegisterWidget<CButtonWidget>("button_widget");
     factory.RegisterWidget<CCheckboxWidget>("checkbox_widget");
+    factory.RegisterWidget<CImageBoxWidget>("image_box_widget");
     factory.RegisterWidget<CRadioButtonGroupWidget>("radio_group_widget");
     factory.RegisterWidget<CProgressBarWidget>("progress_bar_widget");
     factory.RegisterWidget<CLuaWidget>("lua_widget");

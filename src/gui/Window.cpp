@@ -7,6 +7,7 @@
 #include "gui/GuiServices.h"
 #include "gui/TextWidget.h"
 #include "gui/WidgetFactory.h"
+#include "gui/controls/ImageWidget.h"
 
 #include <algorithm>
 
@@ -142,6 +143,8 @@ void CWindow::SetSize(float width, float height)
 
 misc::FloatVector CWindow::GetPreferredSize() const
 {
+    if (const auto* image = dynamic_cast<const CImageWidget*>(m_Background.get()))
+        return image->GetImage().GetTextureSize();
     return m_Background ? m_Background->GetPreferredSize() : FloatVector();
 }
 

@@ -16,6 +16,7 @@
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
 #include "gui/controls/ToolTipHelperWidget.h"
+#include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 
 using namespace ox::gui;
@@ -34,6 +35,7 @@ const char* kTemplates = R"(
     <label_template id="text" font="mono"/>
     <button_template id="plain" image="strip" sound_on_press="press" sound_on_over="over"
                      sound_on_disabled_press="denied" label_template="text" image_fade_time="0.2"/>
+    <imagebox_template id="framed" frame_image="tip_back"><insets left="5" top="5" right="5" bottom="5"/></imagebox_template>
     <checkbox_template id="check" box_image="box" check_image="tick" font="mono" indent="4" check_time="0.1"
                        sound_on_check="check" sound_on_check_true="on" sound_on_check_false="off"/>
   </GUITemplates>)";
@@ -344,6 +346,7 @@ TEST_F(ControlsTest, EveryControlIsMadeByItsElementName)
         {"checkbox_widget", [](CWidget* w) { return dynamic_cast<CCheckboxWidget*>(w) != nullptr; }},
         {"radio_group_widget", [](CWidget* w) { return dynamic_cast<CRadioButtonGroupWidget*>(w) != nullptr; }},
         {"progress_bar_widget", [](CWidget* w) { return dynamic_cast<CProgressBarWidget*>(w) != nullptr; }},
+        {"image_box_widget", [](CWidget* w) { return dynamic_cast<CImageBoxWidget*>(w) != nullptr; }},
     };
     for (const auto& [name, is] : kinds) {
         WidgetPtrT made = GetWidgetFactory().Create(name);
@@ -391,4 +394,63 @@ TEST_F(ControlsTest, ScriptsTellControlsApartAndFadeTheirWindows)
     ASSERT_EQ(window->GetEffects().size(), 1u) << "the script's effect is the window's now";
     for (const auto& box : boxes.Boxes())
         ADD_FAILURE() << box.caption << ": " << box.text;
+}
+
+TEST_F(ControlsTest, ImagesStretchShrinkOrStandAtTheirNaturalSize)
+{
+    Show(R"(<image_widget id="natural" image="box" abs_pos="true"/>
+            <image_widget id="sized" image="frame" width="50" height="50" abs_pos="true"/>)");
+    auto& natural = Get<CImageWidget>("natural");
+    EXPECT_EQ(natural.GetSize(), FloatVector(16, 16)) << "no size takes the image's";
+    natural.SetSize(40, 20);
+    EXPECT_EQ(natural.GetImageRect(), ox::misc::FloatRect(0, 0, 40, 20)) << "stretched by default";
+    natural.SetStretchType(CImageWidget::StretchOnlyDecrease);
+    EXPECT_EQ(natural.GetImageRect(), ox::misc::FloatRect(12, 2, 16, 16)) << "small: natural size, centred";
+    auto& sized = Get<CImageWidget>("sized");
+    sized.SetStretchType(CImageWidget::StretchOnlyDecrease);
+    EXPECT_EQ(sized.GetImageRect(), ox::misc::FloatRect(0, 22.5f, 50, 5)) << "large: shrunk in proportion";
+    sized.SetStretchType(CImageWidget::StretchNo);
+    EXPECT_EQ(sized.GetImageRect(), ox::misc::FloatRect(-25, 20, 100, 10));
+    EXPECT_EQ(sized.GetPreferredSize(), FloatVector(100, 10));
+
+    auto bare = oxtest::LoadWindow<ActionWindow>(std::string("<window window_template=\"tips\"/>") + kTemplates);
+    EXPECT_EQ(bare->GetSize(), FloatVector(100, 10)) << "a window wants its background image's size";
+}
+
+TEST_F(ControlsTest, ToolbarIsDraggedByItsOwnAreaAndItsButtonsStillPress)
+{
+    Show(R"(<toolbar_widget id="bar" back_image="frame" x="50" y="50" abs_pos="true">
+              <button_widget id="tool" button_template="plain" x="4" y="-3" abs_pos="true"/>
+            </toolbar_widget>)");
+    auto& bar = *window->GetWidget("bar");
+    EXPECT_EQ(bar.GetSize(), FloatVector(100, 10));
+    Click(58, 52);
+    EXPECT_EQ(window->Take(), (Strings {"overed tool", "pressed tool"}));
+    EXPECT_EQ(bar.GetOffset(), FloatVector(50, 50)) << "a press on a button doesn't drag";
+
+    Move(130, 55);
+    Down(130, 55);
+    Move(160, 85);
+    Move(170, 95); // past the toolbar: it follows
+    Up(170, 95);
+    Move(180, 105);
+    EXPECT_EQ(bar.GetOffset(), FloatVector(90, 90));
+}
+
+TEST_F(ControlsTest, ImageBoxPlacesItsPictureInsideTheFrameAndTellsOfPresses)
+{
+    Show(R"(<image_box_widget id="fit" imagebox_template="framed" image="frame" width="110" height="110" x="0" y="0"
+                              abs_pos="true"/>
+            <image_box_widget id="fill" imagebox_template="framed" image="frame" stretch="fill" width="110"
+                              height="110" x="200" y="0" abs_pos="true"/>
+            <image_box_widget id="odd" image="frame" stretch="sideways" abs_pos="true"/>)");
+    auto& fit = Get<CImageBoxWidget>("fit");
+    EXPECT_EQ(fit.GetContentRect(), ox::misc::FloatRect(5, 50, 100, 10)) << "fitted inside the insets";
+    EXPECT_EQ(Get<CImageBoxWidget>("fill").GetContentRect(), ox::misc::FloatRect(-445, 5, 1000, 100))
+        << "filled, and clipped when drawn";
+    fit.SetStretch(CImageBoxWidget::StretchNone);
+    EXPECT_EQ(fit.GetContentRect(), ox::misc::FloatRect(5, 50, 100, 10));
+    EXPECT_TRUE(log.Contains("<image_box_widget id=\"odd\">: stretch is none of no, fit, width, height, fill"));
+    Click(20, 20);
+    EXPECT_EQ(window->Take(), Strings {"on_mouse_down fit"});
 }
