@@ -87,6 +87,7 @@ CApp::~CApp()
     m_Demo.reset();
     core::CFontManager::Instance().SetTextureLookup(nullptr);
     gui::GetGuiServices().findFont = nullptr;
+    gui::GetGuiServices().isSound = nullptr;
     misc::anim::GetClipServices() = misc::anim::ClipServices();
     CloseOutput();
     m_GameFolder.clear();
@@ -188,6 +189,7 @@ bool CApp::Init()
     gui::GetGuiServices().findFont = [](const char* id) -> const graphics::CFont* {
         return core::CFontManager::Instance().GetItem(id);
     };
+    gui::GetGuiServices().isSound = [](const std::string& id) { return sound::CAudioManager::Instance().IsSound(id.c_str()); };
     // The quest: the pack's compiled form, or quest.xml compiled now. Levels are built from it
     // on demand, binding their textures and clips.
     qe::g_QuestData::Instance().Load();

@@ -25,6 +25,8 @@ struct GuiServices {
     std::function<bool()> isFullscreen;
     // Plays a declared sound by id with its default parameters.
     std::function<void(const std::string& id)> playSound;
+    // Whether a sound of the id is declared; without it descriptions aren't checked for sounds.
+    std::function<bool(const std::string& id)> isSound;
     // A new effect of a registered name, or null for an unknown name.
     std::function<EffectPtrT(const wstring& name)> createEffect;
     // A declared font by id, or null: what labels and check boxes write with.

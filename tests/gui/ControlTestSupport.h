@@ -73,6 +73,12 @@ struct ControlFixture : ::testing::Test {
         ox::gui::GuiServices& services = ox::gui::GetGuiServices();
         services.findFont = [this](const char* id) { return std::string(id) == "mono" ? &font : nullptr; };
         services.playSound = [this](const std::string& id) { sounds.push_back(id); };
+        services.isSound = [](const std::string& id) {
+            for (const char* known : {"press", "over", "denied", "check", "on", "off"})
+                if (id == known)
+                    return true;
+            return false;
+        };
         ox::gui::RegisterFrameworkWidgets(ox::gui::GetWidgetFactory());
     }
     void TearDown() override
@@ -80,6 +86,7 @@ struct ControlFixture : ::testing::Test {
         ox::gui::GuiServices& services = ox::gui::GetGuiServices();
         services.findFont = nullptr;
         services.playSound = nullptr;
+        services.isSound = nullptr;
         ox::graphics::CImage::SetTextureLookup(nullptr);
     }
     std::vector<RecordingBackend::Draw> Draws()

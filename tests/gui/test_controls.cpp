@@ -309,7 +309,8 @@ TEST_F(ControlsTest, BadDescriptionsAreLoggedNamingTheTemplateAndTheControlsStil
             <progress_bar_widget id="empty" frame="nope" abs_pos="true"/>
             <clip_widget id="noclip" clip="no_such_clip" abs_pos="true"/>)",
          R"(<GUITemplates>
-              <button_template id="bad" image="nope" image_fade_time="soon" label_template="nolabel"/>
+              <button_template id="bad" image="nope" image_fade_time="soon" label_template="nolabel"
+                               sound_on_press="hush"/>
               <checkbox_template id="odd" box_image="box" indent="-5" font="nofont"/>
               <label_template id="nofont" font="nofont"/>
             </GUITemplates>)");
@@ -317,6 +318,7 @@ TEST_F(ControlsTest, BadDescriptionsAreLoggedNamingTheTemplateAndTheControlsStil
              "<button_widget id=\"lost\">: no such template, defaults used: button_template \"missing\"",
              "<button_template id=\"bad\">: no such texture, not drawn: image=\"nope\"",
              "<button_template id=\"bad\">: not a number, ignored: image_fade_time=\"soon\"",
+             "<button_template id=\"bad\">: no such sound, silent: sound_on_press=\"hush\"",
              "no such template, defaults used: label_template \"nolabel\"",
              "<button_widget id=\"bad\">: not a colour, ignored: color_over=\"blue\"",
              "<checkbox_widget id=\"odd\">: not true or false, ignored: checked=\"maybe\"",

@@ -46,9 +46,9 @@ void CButtonWidget::Load(const core::CSettingsGroup& node, const core::CSettings
     ReadChecked(tmpl, "tile_step_x", m_TileStepX, 0, kMaxTileStep);
     ReadChecked(tmpl, "tile_step_y", m_TileStepY, 0, kMaxTileStep);
     ReadSeconds(tmpl, "image_fade_time", m_FadeTime);
-    m_SoundOnPress = tmpl.GetValue("sound_on_press");
-    m_SoundOnOver = tmpl.GetValue("sound_on_over");
-    m_SoundOnDisabledPress = tmpl.GetValue("sound_on_disabled_press");
+    m_SoundOnPress = ReadSound(tmpl, "sound_on_press");
+    m_SoundOnOver = ReadSound(tmpl, "sound_on_over");
+    m_SoundOnDisabledPress = ReadSound(tmpl, "sound_on_disabled_press");
     ReadImage(tmpl, "image", m_Image);
 
     if (tmpl.IsValue("label_template")) {

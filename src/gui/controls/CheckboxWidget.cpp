@@ -28,9 +28,9 @@ void CCheckboxWidget::Load(const core::CSettingsGroup& node, const core::CSettin
     ReadImage(tmpl, "gray_box_image", m_GrayBox);
     ReadImage(tmpl, "gray_check_image", m_GrayTick);
     ReadChecked(tmpl, "indent", m_Indent, 0, kMaxDescriptionSize);
-    m_SoundOnCheck = tmpl.GetValue("sound_on_check");
-    m_SoundOnCheckTrue = tmpl.GetValue("sound_on_check_true");
-    m_SoundOnCheckFalse = tmpl.GetValue("sound_on_check_false");
+    m_SoundOnCheck = ReadSound(tmpl, "sound_on_check");
+    m_SoundOnCheckTrue = ReadSound(tmpl, "sound_on_check_true");
+    m_SoundOnCheckFalse = ReadSound(tmpl, "sound_on_check_false");
     ReadSeconds(tmpl, "check_time", m_CheckTime);
 
     auto* label = new CLabelWidget();

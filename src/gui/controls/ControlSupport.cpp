@@ -49,6 +49,15 @@ bool ReadImage(const core::CSettingsGroup& owner, const char* key, graphics::CIm
     return image.HasTexture();
 }
 
+std::string ReadSound(const core::CSettingsGroup& owner, const char* key)
+{
+    const std::string& id = owner.GetValue(key);
+    const auto& known = GetGuiServices().isSound;
+    if (!id.empty() && known && !known(id))
+        ReportElement(owner, "no such sound, silent: ", std::string(key) + "=\"" + id + "\"");
+    return id;
+}
+
 bool ReadFlag(const core::CSettingsGroup& node, const char* name, bool& value)
 {
     if (!node.IsValue(name))

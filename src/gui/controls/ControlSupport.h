@@ -26,6 +26,8 @@ const graphics::CFont* ReadFont(const core::CSettingsGroup& owner, const char* k
 // The texture the attribute `key` of `owner` names, into `image` (which is emptied first);
 // false without one, false and logged when unknown.
 bool ReadImage(const core::CSettingsGroup& owner, const char* key, graphics::CImage& image);
+// The sound id the attribute `key` of `owner` names; one that isn't declared is logged.
+std::string ReadSound(const core::CSettingsGroup& owner, const char* key);
 // "true" or "false" (also "1", "0") when present; anything else is logged and ignored.
 bool ReadFlag(const core::CSettingsGroup& node, const char* name, bool& value);
 // A colour when present; one that cannot be read is logged and ignored.
