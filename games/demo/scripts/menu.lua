@@ -27,12 +27,15 @@ function Menu.Describe(id)
     if not g_Application then
         return nil
     end
-    local settings = g_Application.GetSettings()
-    local node = settings.GetChildByAttributeRef("window", "id", id, true)
-    if not node then
+    local ok, node, templates = pcall(function()
+        local settings = g_Application.GetSettings()
+        return settings.GetChildByAttributeRef("window", "id", id, true), settings.GetChild("GUITemplates", false)
+    end)
+    if not ok then
+        say("the GUI description cannot be read: " .. tostring(node))
         return nil
     end
-    return node, settings.GetChild("GUITemplates", false)
+    return node, templates
 end
 
 -- Makes the window `id` and opens it over `parent`, fading in. False when the description
@@ -84,7 +87,10 @@ function LoadingProgress.DoUpdate(self)
     end
     if Menu.done == #Menu.steps then
         Menu.done = Menu.done + 1
-        Menu.Open(g_Application.GetMainWindow(), "main_menu")
+        -- Without a menu the game starts at once.
+        if not Menu.Open(g_Application.GetMainWindow(), "main_menu") then
+            Menu.Play()
+        end
         return false
     end
     Menu.done = Menu.done + 1
