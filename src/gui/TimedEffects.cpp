@@ -28,12 +28,27 @@ CTimedEffect::CTimedEffect(float duration, float delay, const char* group)
 {
 }
 
-unsigned CTimedEffect::GetTime() const { return m_Timer.Get() ? m_Timer.Get()->GetTime() : 0; }
+CTimedEffect::~CTimedEffect()
+{
+    if (HasClock())
+        m_Timer->Destroy();
+}
+
+bool CTimedEffect::HasClock() const
+{
+    // A group that goes (a level that ends) takes its timers with it.
+    return m_Timer && core::GetTimeManager().IsKnown(m_Timer);
+}
+
+unsigned CTimedEffect::GetTime() const { return HasClock() ? m_Timer->GetTime() : 0; }
 
 void CTimedEffect::InitWidget(CBaseWidget& /*widget*/) { m_StartTime += static_cast<float>(GetTime()); }
 
 float CTimedEffect::Progress() const
 {
+    // Without a clock the change is over at once.
+    if (!HasClock())
+        return 1.0f;
     const float t = static_cast<float>(GetTime());
     if (t >= m_StartTime + m_Duration)
         return 1.0f;

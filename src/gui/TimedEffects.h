@@ -16,21 +16,27 @@ namespace ox::gui {
 // the root), a start time turned absolute when the effect meets its widget, a duration.
 class CTimedEffect : public CEffect {
 public:
+    ~CTimedEffect() override;
+    CTimedEffect(const CTimedEffect&) = delete;
+    CTimedEffect& operator=(const CTimedEffect&) = delete;
+
     void InitWidget(CBaseWidget& widget) override;
     unsigned GetTime() const;
     // The effect's own clock.
-    core::CTimer* GetTimer() { return m_Timer.Get(); }
+    core::CTimer* GetTimer() { return HasClock() ? m_Timer : nullptr; }
 
 protected:
     CTimedEffect(float duration, float delay, const char* group);
     // Where the change stands at the timer's time: below 0 not begun, 1 or more done.
     float Progress() const;
+    bool HasClock() const;
 
     float m_StartTime;
     float m_Duration;
 
 private:
-    core::CTimerWrapper m_Timer;
+    // Not a timer wrapper: a timer whose group went is gone already and must not be destroyed.
+    core::CTimer* m_Timer;
 };
 
 // Moves the widget from where it stands to `target`, in a straight line.

@@ -87,7 +87,11 @@ TEST(Effects, EffectsRunOnTheirGroupsClockAndAnUnknownGroupIsLogged)
     boost::intrusive_ptr<CColorChangeEffect> lost(new CColorChangeEffect(Color(0u), 100, 0, "no_such_group"));
     EXPECT_EQ(lost->GetTimer()->GetParent(), ox::core::GetTimeManager().GetRoot());
     EXPECT_TRUE(log.Contains("effect: no timer group \"no_such_group\""));
-    fade.reset();
-    lost.reset();
+    // The group goes (as a level's does when it ends): the effect ends at its target.
+    WidgetPtrT widget(new CWidget());
+    widget->AddEffect(fade);
     group->Destroy();
+    widget->Update();
+    EXPECT_EQ(widget->GetColor(), Color(0u));
+    EXPECT_TRUE(fade->IsDead());
 }
