@@ -70,10 +70,7 @@ void CButtonWidget::Load(const core::CSettingsGroup& node, const core::CSettings
     if (core::ReadLocalText(node, "text", text))
         SetText(text);
     CWidget::Load(node, templates);
-    const FloatVector preferred = GetPreferredSize();
-    const FloatVector& size = GetSize();
-    if (size.X == 0 || size.Y == 0)
-        SetSize(size.X == 0 ? preferred.X : size.X, size.Y == 0 ? preferred.Y : size.Y);
+    TakeNaturalSize(*this, GetPreferredSize());
     if (m_Label)
         m_Label->SetSize(GetSize().X, GetSize().Y);
     bool disabled = false;

@@ -1,6 +1,7 @@
 #include "gui/controls/ClipWidget.h"
 
 #include "gui/Description.h"
+#include "gui/controls/ControlSupport.h"
 
 namespace ox::gui {
 
@@ -11,10 +12,7 @@ void CClipWidget::Load(const core::CSettingsGroup& node, const core::CSettingsGr
     if (!id.empty() && !m_Loaded)
         ReportElement(node, "no such clip, nothing is drawn: ", id);
     CWidget::Load(node, templates);
-    const FloatVector view = m_Clip.GetViewSize();
-    const FloatVector& size = GetSize();
-    if (size.X == 0 || size.Y == 0)
-        SetSize(size.X == 0 ? view.X : size.X, size.Y == 0 ? view.Y : size.Y);
+    TakeNaturalSize(*this, m_Clip.GetViewSize());
 }
 
 void CClipWidget::DoUpdate()

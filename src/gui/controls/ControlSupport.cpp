@@ -2,10 +2,10 @@
 
 #include "core/SettingsReaders.h"
 #include "graphics/Renderer.h"
+#include "graphics/Texture.h"
 #include "gui/Description.h"
 #include "gui/GuiServices.h"
 #include "gui/Widget.h"
-#include "graphics/Texture.h"
 
 #include <cmath>
 #include <cstdio>
@@ -120,10 +120,6 @@ unsigned ParseJustification(const std::string& words)
     return flags;
 }
 
-} // namespace ox::gui
-
-namespace ox::gui {
-
 void TellParent(CWidget& sender, const char* action)
 {
     CBaseWidget* parent = sender.GetParentWidget();
@@ -131,6 +127,14 @@ void TellParent(CWidget& sender, const char* action)
         return;
     WidgetPtrT held(&sender);
     parent->OnChildAction(action, &sender);
+}
+
+void TakeNaturalSize(CWidget& widget, const misc::FloatVector& natural)
+{
+    const misc::FloatVector size = widget.GetSize();
+    const bool noWidth = size.X < 0.001f, noHeight = size.Y < 0.001f;
+    if (noWidth || noHeight)
+        widget.SetSize(noWidth ? natural.X : size.X, noHeight ? natural.Y : size.Y);
 }
 
 bool IsInside(const CWidget& widget, const misc::IntVector& pos)

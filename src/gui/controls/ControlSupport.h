@@ -1,10 +1,11 @@
 #pragma once
-// What the controls share when they read their look: the template a description names, the
-// fonts, textures and numbers it gives, each checked. A value a game maker got wrong is
-// logged naming the template (or the element) and the control goes on with its default.
+// What the controls share: reading their look (the template a description names, the fonts,
+// textures, sounds and values it gives, each checked: a value a game maker got wrong is
+// logged naming the template or the element, and the control goes on with its default),
+// telling their parent, and their own clocks.
 #include "core/Settings.h"
-#include "graphics/Color.h"
 #include "core/TimeManager.h"
+#include "graphics/Color.h"
 #include "graphics/Image.h"
 #include "misc/Rect.h"
 #include "misc/Vector.h"
@@ -38,20 +39,19 @@ bool ReadSeconds(const core::CSettingsGroup& node, const char* name, unsigned& m
 // this order, then the first of "top", "bottom", "center": "center" alone centres both ways.
 unsigned ParseJustification(const std::string& words);
 
-} // namespace ox::gui
-
-namespace ox::gui {
-
 class CWidget;
 
 // Tells the sender's parent what happened ("pressed", "overed", ...). The sender is held
 // while the parent (and the script behind it) reacts, so that it may remove it.
 void TellParent(CWidget& sender, const char* action);
+// A width or height of 0 (below 0.001) takes the natural one: after loading, a control
+// given no size takes its image's.
+void TakeNaturalSize(CWidget& widget, const misc::FloatVector& natural);
 // Whether a point in a widget's own coordinates lies inside its rectangle.
 bool IsInside(const CWidget& widget, const misc::IntVector& pos);
 // Part `index` of `count` equal parts side by side in a texture, in surface pixels.
 misc::ShortRect StripPart(const graphics::CTexture& texture, int index, int count);
-// The clock of a control's own timer: a new timer under the root, or the root's time.
+// The time of a control's own timer (0 without one).
 unsigned TimerNow(const core::CTimerWrapper& timer);
 
 } // namespace ox::gui

@@ -12,10 +12,7 @@ void CImageWidget::Load(const core::CSettingsGroup& node, const core::CSettingsG
 {
     ReadImage(node, "image", m_Image);
     CWidget::Load(node, templates);
-    const FloatVector natural = m_Image.GetTextureSize();
-    const FloatVector& size = GetSize();
-    if (size.X == 0 || size.Y == 0)
-        SetSize(size.X == 0 ? natural.X : size.X, size.Y == 0 ? natural.Y : size.Y);
+    TakeNaturalSize(*this, m_Image.GetTextureSize());
     PlaceImage();
 }
 

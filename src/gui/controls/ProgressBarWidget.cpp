@@ -46,11 +46,8 @@ void CProgressBarWidget::Load(const core::CSettingsGroup& node, const core::CSet
     float value = m_Value;
     ReadChecked(node, "value", value, 0.0f, 1.0f);
     CWidget::Load(node, templates);
-    FloatVector image = GetFrame()->GetImage().GetTextureSize();
-    if (image.X == 0)
-        image = GetBar()->GetImage().GetTextureSize();
-    const FloatVector& size = GetSize();
-    SetSize(size.X < 0.001f ? image.X : size.X, size.Y < 0.001f ? image.Y : size.Y);
+    const FloatVector frame = GetFrame()->GetImage().GetTextureSize();
+    TakeNaturalSize(*this, frame.X > 0 ? frame : GetBar()->GetImage().GetTextureSize());
     SetValue(value);
 }
 

@@ -10,10 +10,7 @@ void CToolbarWidget::Load(const core::CSettingsGroup& node, const core::CSetting
 {
     ReadImage(node, "back_image", m_Back);
     CWidget::Load(node, templates);
-    const FloatVector image = m_Back.GetTextureSize();
-    const FloatVector& size = GetSize();
-    if (size.X == 0 || size.Y == 0)
-        SetSize(size.X == 0 ? image.X : size.X, size.Y == 0 ? image.Y : size.Y);
+    TakeNaturalSize(*this, m_Back.GetTextureSize());
 }
 
 void CToolbarWidget::DoDraw(graphics::CRenderer& renderer)
