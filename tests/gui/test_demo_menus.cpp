@@ -149,7 +149,10 @@ TEST_F(DemoMenus, BarFillsThenTheMenuLeadsToOptionsAndPlay)
     manager.Update();
     EXPECT_EQ(menu->GetChildWindow(), nullptr) << "OK closes the options";
 
-    Press(menu, "profiles"); // the demo has no such window: nothing opens
+    // The demo has no profiles window: its button is disabled, and nothing opens.
+    EXPECT_EQ(Find<CButtonWidget>(menu, "profiles")->GetButtonState(), CButtonWidget::StateDisabled);
+    EXPECT_EQ(Find<CButtonWidget>(menu, "play")->GetButtonState(), CButtonWidget::StateNormal);
+    Press(menu, "profiles");
     EXPECT_EQ(menu->GetChildWindow(), nullptr);
     Press(menu, "quit");
     EXPECT_EQ(app.stops, 1);

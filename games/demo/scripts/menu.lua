@@ -51,6 +51,14 @@ function Menu.Open(parent, id)
     window.UpdateLayout()
     if id == "options" then
         OptionsWindow.Show(window)
+    elseif id == "main_menu" then
+        -- The buttons of windows the game doesn't have are disabled.
+        for _, other in ipairs({ "profiles", "records" }) do
+            local button = ox.gui.CButtonWidget.Cast(window.GetWidget(other, true))
+            if button and Menu.found and Menu.found[other] == false then
+                button.DisableButton(true)
+            end
+        end
     end
     window.SetColor(0x00FFFFFF)
     parent.AddChildWindow(window)
