@@ -4,6 +4,9 @@
 #include "core/Settings.h"
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
+#include "graphics/Font.h"
+#include "graphics/Image.h"
+#include "gui/GuiServices.h"
 #include "gui/LayoutBox.h"
 #include "gui/WidgetFactory.h"
 #include "gui/WidgetManager.h"
@@ -11,6 +14,7 @@
 
 #include <benchmark/benchmark.h>
 
+#include <cstring>
 #include <deque>
 #include <string>
 
@@ -237,5 +241,81 @@ static void BM_ClickDispatch(benchmark::State& state)
     state.counters["widgets"] = static_cast<double>(count);
 }
 BENCHMARK(BM_ClickDispatch)->Arg(20)->Unit(benchmark::kMicrosecond);
+
+namespace {
+
+// A font of the letters a to z, each 10 wide and 20 high, on a 256 x 64 glyph texture.
+std::string MenuFontXml()
+{
+    std::string xml = "<?xml version=\"1.0\"?><Font Padding=\"0 0 0 0\" Space=\"5\" PixHeight=\"20\" Baseline=\"6\" "
+                      "SymbolGap=\"1\" LineGap=\"0\">";
+    for (int i = 0; i < 26; ++i)
+        xml += "<Char Code=\"" + std::string(1, static_cast<char>('a' + i)) + "\" Width=\"10\" Rect=\"" +
+               std::to_string(i % 25 * 10) + " " + std::to_string(i / 25 * 20) + " " + std::to_string(i % 25 * 10 + 10) +
+               " " + std::to_string(i / 25 * 20 + 20) + "\"/>";
+    return xml + "</Font>";
+}
+
+// A menu window of `count` controls in rows of four: labels with a word of text and
+// buttons with a four-state image and a label, found by id as a game's would be.
+std::string MenuDescription(int count)
+{
+    std::string xml = "<?xml version=\"1.0\"?><gui><window width=\"1024\" height=\"768\" orient=\"vertical\">";
+    for (int i = 0; i < count; ++i) {
+        if (i % 4 == 0)
+            xml += i ? "</hbox><hbox>" : "<hbox>";
+        xml += i % 2 ? "<button_widget button_template=\"b\" text=\"press\" width=\"60\" height=\"10\"/>"
+                     : "<label_widget label_template=\"l\" text=\"menu label\"/>";
+    }
+    xml += "</hbox></window><GUITemplates><label_template id=\"l\" font=\"mono\"/>"
+           "<button_template id=\"b\" image=\"strip\" label_template=\"l\" image_fade_time=\"0.2\"/>"
+           "</GUITemplates></gui>";
+    return xml;
+}
+
+} // namespace
+
+// One frame of a menu window of 200 controls (labels with text, buttons with images and
+// labels): the update walk, then the draw walk with the text laid out.
+static void BM_MenuFrame(benchmark::State& state)
+{
+    Frame frame;
+    ox::graphics::CSurface glyphSurface(256, 64), stripSurface(256, 16);
+    ox::graphics::CTexture glyphs(&glyphSurface), strip(&stripSurface);
+    const std::string fontXml = MenuFontXml();
+    ox::graphics::FontBlock block;
+    ox::graphics::CFont font;
+    if (!ox::graphics::BuildFontBlock(fontXml.data(), fontXml.size(), "mono", "mono.xml", &glyphs, block)) {
+        state.SkipWithError("the font cannot be built");
+        return;
+    }
+    font.Attach(block.data());
+    font.Texture = &glyphs;
+    GetGuiServices().findFont = [&font](const char*) { return &font; };
+    ox::graphics::CImage::SetTextureLookup([&strip](const char*) { return &strip; });
+    RegisterFrameworkWidgets(GetWidgetFactory());
+
+    const std::string xml = MenuDescription(static_cast<int>(state.range(0)));
+    ox::core::CSettings settings;
+    settings.LoadXmlFromMemory(xml.data(), xml.size(), "menu.xml");
+    boost::intrusive_ptr<CWindow> window(new CWindow());
+    window->Load(settings.GetFirstChild().GetChild("window"), settings.GetFirstChild().GetChild("GUITemplates"));
+    window->UpdateLayout();
+    // The rows are bare boxes: the controls are the window's children.
+    const double controls = static_cast<double>(window->GetWidgets().size());
+    for (auto _ : state) {
+        frame.renderer.BeginScene();
+        window->Update();
+        window->Draw(frame.renderer);
+        frame.renderer.EndScene();
+    }
+    GetGuiServices().findFont = nullptr;
+    ox::graphics::CImage::SetTextureLookup(nullptr);
+    state.SetItemsProcessed(state.iterations());
+    state.counters["controls"] = controls;
+    state.counters["vertices/frame"] =
+        static_cast<double>(frame.backend->vertices) / static_cast<double>(state.iterations());
+}
+BENCHMARK(BM_MenuFrame)->Arg(200)->Unit(benchmark::kMicrosecond);
 
 BENCHMARK_MAIN();

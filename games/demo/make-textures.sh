@@ -19,6 +19,16 @@ trap 'rm -rf "$scratch"' EXIT
 "$tools/oxmedia" png "$out/textures/demo_frame.png" --size 48x48 --pattern checker
 "$tools/oxmedia" png "$scratch/stone.png" --size 64x64 --pattern gradient
 "$tools/oxmedia" pvr "$scratch/stone.png" "$out/textures/demo_stone.pvr" --format dxt1
+# The menus' controls: a button strip of four states (normal, over, pressed, disabled) whose
+# red rises from state to state, a check box and its tick, a progress bar's frame and bar,
+# the menu windows' background and the tool tips' back.
+"$tools/oxmedia" png "$out/textures/menu_button.png" --size 640x40 --pattern gradient
+"$tools/oxmedia" png "$out/textures/menu_box.png" --size 24x24 --pattern checker
+"$tools/oxmedia" png "$out/textures/menu_tick.png" --size 16x16 --pattern circle
+"$tools/oxmedia" png "$out/textures/menu_bar_frame.png" --size 400x12 --pattern stripes
+"$tools/oxmedia" png "$out/textures/menu_bar.png" --size 400x12 --pattern gradient
+"$tools/oxmedia" png "$out/textures/menu_back.png" --size 64x64 --pattern gradient
+"$tools/oxmedia" png "$out/textures/menu_tip_back.png" --size 16x16 --pattern checker
 
 # The declarations read image sizes from the files, so they come after the images. The fonts'
 # glyph images are declared too; they are made by oxfont (see README.md), not here.

@@ -13,6 +13,7 @@
 #include "game/Profile.h"
 #include "game/RecordTable.h"
 #include "gui/Cursor.h"
+#include "gui/GuiServices.h"
 #include "lua/LuaHeap.h"
 #include "graphics/Font.h"
 #include "misc/Unicode.h"
@@ -91,6 +92,8 @@ CApp::~CApp()
 {
     m_Demo.reset();
     core::CFontManager::Instance().SetTextureLookup(nullptr);
+    gui::GetGuiServices().findFont = nullptr;
+    gui::GetGuiServices().isSound = nullptr;
     misc::anim::GetClipServices() = misc::anim::ClipServices();
     CloseOutput();
     m_GameFolder.clear();
@@ -189,6 +192,11 @@ bool CApp::Init()
         return core::CTextureManager::Instance().GetItem(id);
     });
     fonts.LoadGroup(m_ResourceDeclarations, nullptr);
+    // Labels and check boxes write with the declared fonts.
+    gui::GetGuiServices().findFont = [](const char* id) -> const graphics::CFont* {
+        return core::CFontManager::Instance().GetItem(id);
+    };
+    gui::GetGuiServices().isSound = [](const std::string& id) { return sound::CAudioManager::Instance().IsSound(id.c_str()); };
     // The quest: the pack's compiled form, or quest.xml compiled now. Levels are built from it
     // on demand, binding their textures and clips.
     qe::g_QuestData::Instance().Load();

@@ -5,6 +5,7 @@
 #include "gui/Description.h"
 #include "gui/LayoutBox.h"
 #include "gui/Widget.h"
+#include "gui/controls/ToolTipHelperWidget.h"
 
 #include <boost/container/small_vector.hpp>
 #include <boost/make_shared.hpp>
@@ -237,6 +238,20 @@ void CBaseWidget::Load(const core::CSettingsGroup& node, const core::CSettingsGr
         m_LayoutBox->DetachWidget();
     m_LayoutBox = boost::make_shared<CLayoutBox>();
     m_LayoutBox->Load(node, templates, this);
+    const wstring tip = core::ReadLocalText(node, "tool_tip_text");
+    if (!tip.empty())
+        AddToolTip(tip);
+}
+
+void CBaseWidget::AddToolTip(const wstring& text)
+{
+    if (auto* helper = dynamic_cast<CToolTipHelperWidget*>(GetWidget(CToolTipHelperWidget::kId))) {
+        helper->SetText(text);
+        return;
+    }
+    WidgetPtrT helper(new CToolTipHelperWidget(text));
+    helper->SetSize(m_Size.X, m_Size.Y);
+    AddWidget(helper);
 }
 
 // The per-frame walks ---------------------------------------------------------------------

@@ -111,7 +111,7 @@ public:
     virtual bool OnMouseWheel(const IntVector& pos, int delta, int keys, bool broadcast);
 
     // Reads id, x, y and color, then the layout box with the child elements (which builds
-    // the children through the widget factory).
+    // the children through the widget factory), then tool_tip_text.
     virtual void Load(const core::CSettingsGroup& node, const core::CSettingsGroup& templates);
     // The widget's own drawing; the base draws the children, back to front.
     virtual void DoDraw(graphics::CRenderer& renderer);
@@ -138,6 +138,10 @@ public:
     void LayChildWidgetInFront(CWidget& _child, const CWidget& _in_front_of_widget);
     // Orders the children by layer, the highest in front.
     void SortChildren();
+
+    // Gives the widget a tool tip (a helper child that watches the pointer), or a new text
+    // for the one it has.
+    void AddToolTip(const wstring& text);
 
     void AddEffect(EffectPtrT effect);
     void RemoveAllEffects() { m_Effects.clear(); }

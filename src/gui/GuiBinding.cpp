@@ -3,6 +3,17 @@
 #include "graphics/Renderer.h"
 #include "gui/Cursor.h"
 #include "gui/LuaWidget.h"
+#include "gui/TimedEffects.h"
+#include "gui/controls/ButtonWidget.h"
+#include "gui/controls/CheckboxWidget.h"
+#include "gui/controls/ClipWidget.h"
+#include "gui/controls/ImageBoxWidget.h"
+#include "gui/controls/ImageWidget.h"
+#include "gui/controls/LabelWidget.h"
+#include "gui/controls/ProgressBarWidget.h"
+#include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ToolTipHelperWidget.h"
+#include "gui/controls/ToolbarWidget.h"
 #include "gui/Window.h"
 #include "gui/WidgetManager.h"
 #include "lua/Lua.h"
@@ -87,6 +98,7 @@ mluabind::i::GenericClass& BaseWidgetClass()
                     .Method("GetPreferredSize", &W::GetPreferredSize)
                     .Method("SetRotation", &W::SetRotation)
                     .Method("SetColor", &W::SetColor)
+                    .Method("SetColor", [](W& w, uint32_t argb) { w.SetColor(graphics::Color(argb)); })
                     .Method("SetChildFocused", &W::SetChildFocused)
                     .Method("OnChildAction", &W::OnChildAction)
                     .Method("OnChar", &W::OnChar)
@@ -112,6 +124,9 @@ mluabind::i::GenericClass& BaseWidgetClass()
                         return w.GetWidget(id ? id : "", recursive);
                     })
                     .Method("AddEffect", &W::AddEffect)
+                    .Method("AddEffect", [](W& w, CEffect* effect) { w.AddEffect(EffectPtrT(effect)); }, Adopt(1))
+                    .Method("AddToolTip", &W::AddToolTip)
+                    .Method("AddToolTip", [](W& w, const char16_t* text) { w.AddToolTip(text ? text : u""); })
                     .Method("RemoveAllEffects", &W::RemoveAllEffects)
                     .Method("GetFlags", &W::GetFlags)
                     .Method("SetFlags", &W::SetFlags)
@@ -235,6 +250,153 @@ mluabind::i::GenericClass& CursorClass()
     return WithConstants(cls, kCursorTypes);
 }
 
+
+// Effects ---------------------------------------------------------------------------------------
+
+void BindEffects(mluabind::Namespace& ns)
+{
+    ns.AddClass(Class<CEffect>("CEffect")
+                    .Method("InitWidget", &CEffect::InitWidget)
+                    .Method("UpdateWidget", &CEffect::UpdateWidget)
+                    .Method("IsDead", &CEffect::IsDead)
+                    .Method("SetDead", &CEffect::SetDead));
+    ns.AddClass(mluabind::IntrusivePtrClass<CEffect>("CEffectPtrT"));
+    using P = CPositionChangeEffect;
+    ns.AddClass(Class<P>("CPositionChangeEffect")
+                    .BaseClass<CEffect>()
+                    .Constructor<const misc::FloatVector&, float, float, const char*>()
+                    .Constructor<float, float, float, float, const char*>()
+                    .Method("InitWidget", &P::InitWidget)
+                    .Method("UpdateWidget", &P::UpdateWidget));
+    using C = CColorChangeEffect;
+    ns.AddClass(Class<C>("CColorChangeEffect")
+                    .BaseClass<CEffect>()
+                    .Constructor<const graphics::Color&, float, float, const char*>()
+                    .Constructor<uint32_t, float, float, const char*>()
+                    .Method("InitWidget", &C::InitWidget)
+                    .Method("UpdateWidget", &C::UpdateWidget));
+    ns.AddClass(Class<CFlagsChangeEffect>("CFlagsChangeEffect")
+                    .BaseClass<CEffect>()
+                    .Constructor<uint32_t, bool, float, const char*>());
+}
+
+// Controls --------------------------------------------------------------------------------------
+
+constexpr NamedValue kStretchTypes[] = {
+    {"StretchMaximum", CImageWidget::StretchMaximum},
+    {"StretchProportional", CImageWidget::StretchProportional},
+    {"StretchOnlyDecrease", CImageWidget::StretchOnlyDecrease},
+    {"StretchNo", CImageWidget::StretchNo},
+};
+
+constexpr NamedValue kButtonStates[] = {
+    {"StateNormal", CButtonWidget::StateNormal},
+    {"StateOver", CButtonWidget::StateOver},
+    {"StatePressed", CButtonWidget::StatePressed},
+    {"StateDisabled", CButtonWidget::StateDisabled},
+};
+
+mluabind::i::GenericClass& ImageWidgetClass()
+{
+    using W = CImageWidget;
+    auto& cls = Class<W>("CImageWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("SetImage", static_cast<void (W::*)(const char*)>(&W::SetImage))
+                    .Method("SetImage", static_cast<void (W::*)(const graphics::CTexture*)>(&W::SetImage))
+                    .Method("GetImage", [](W& w) -> graphics::CImage& { return w.GetImage(); })
+                    .Method("GetImage", [](const W& w) -> const graphics::CImage& { return w.GetImage(); })
+                    .Method("SetStretchType", &W::SetStretchType)
+                    .Method("GetStretchType", &W::GetStretchType);
+    return WithConstants(cls, kStretchTypes);
+}
+
+mluabind::i::GenericClass& LabelWidgetClass()
+{
+    using W = CLabelWidget;
+    return Class<W>("CLabelWidget")
+        .BaseClass<CWidget>()
+        .Constructor<>()
+        .Method("ResizeToFitText", static_cast<void (W::*)(bool)>(&W::ResizeToFitText))
+        .Method("SetText", &W::SetText)
+        .Method("SetText", [](W& w, const char16_t* text) { w.SetText(text ? text : u""); })
+        .Method("GetText", &W::GetText)
+        .Method("SetJustifications", &W::SetJustifications)
+        .Method("SetFontScale", &W::SetFontScale)
+        .Method("SetWordBreak", &W::SetWordBreak);
+}
+
+mluabind::i::GenericClass& ButtonWidgetClass()
+{
+    using W = CButtonWidget;
+    auto& cls = Class<W>("CButtonWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("SetText", &W::SetText)
+                    .Method("SetText", [](W& w, const char16_t* text) { w.SetText(text ? text : u""); })
+                    .Method("GetText", &W::GetText)
+                    .Method("SetLabelColor", &W::SetLabelColor)
+                    .Method("GetButtonState", [](const W& w) { return static_cast<int>(w.GetButtonState()); })
+                    .Method("GetButtonStateInt", &W::GetButtonStateInt)
+                    .Method("DisableButton", &W::DisableButton)
+                    .Method("OnButtonPressed", &W::OnButtonPressed)
+                    .Method("OnMouseMove", &W::OnMouseMove);
+    return WithConstants(cls, kButtonStates);
+}
+
+// Scripts get widgets by their static type (a sender, GetWidget): `<Class>.Cast(widget)`
+// gives the widget as the control it is, or nil.
+template <class W>
+void AddCast(mluabind::Namespace& ns, const char* name)
+{
+    ns.AddFunction(mluabind::Function(name, [](CBaseWidget* widget) { return dynamic_cast<W*>(widget); }));
+}
+
+void BindControls(mluabind::Namespace& ns)
+{
+    ns.AddClass(ImageWidgetClass());
+    ns.AddClass(LabelWidgetClass());
+    ns.AddClass(Class<CClipWidget>("CClipWidget").BaseClass<CWidget>().Constructor<>().Method("GetClip", &CClipWidget::GetClip));
+    ns.AddClass(ButtonWidgetClass());
+    using C = CCheckboxWidget;
+    ns.AddClass(Class<C>("CCheckboxWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("Check", &C::Check)
+                    .Method("IsChecked", &C::IsChecked)
+                    .Method("SetUnspecifiedState", &C::SetUnspecifiedState)
+                    .Method("OnCheckChanged", &C::OnCheckChanged));
+    using R = CRadioButtonGroupWidget;
+    ns.AddClass(Class<R>("CRadioButtonGroupWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("GetChecked", &R::GetChecked)
+                    .Method("Check", static_cast<void (R::*)(int)>(&R::Check))
+                    .Method("OnChangeChecked", &R::OnChangeChecked));
+    using P = CProgressBarWidget;
+    ns.AddClass(Class<P>("CProgressBarWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("SetImages", &P::SetImages)
+                    .Method("SetValue", &P::SetValue)
+                    .Method("GetValue", &P::GetValue));
+    ns.AddClass(Class<CToolbarWidget>("CToolbarWidget").BaseClass<CWidget>().Constructor<>());
+    ns.AddClass(Class<CImageBoxWidget>("CImageBoxWidget").BaseClass<CWidget>().Constructor<>());
+    ns.AddClass(Class<CToolTipHelperWidget>("CToolTipHelperWidget")
+                    .BaseClass<CWidget>()
+                    .Method("StopShowToolTip", &CToolTipHelperWidget::StopShowToolTip));
+    AddCast<CImageWidget>(ns, "CImageWidget.Cast");
+    AddCast<CLabelWidget>(ns, "CLabelWidget.Cast");
+    AddCast<CClipWidget>(ns, "CClipWidget.Cast");
+    AddCast<CButtonWidget>(ns, "CButtonWidget.Cast");
+    AddCast<CCheckboxWidget>(ns, "CCheckboxWidget.Cast");
+    AddCast<CRadioButtonGroupWidget>(ns, "CRadioButtonGroupWidget.Cast");
+    AddCast<CProgressBarWidget>(ns, "CProgressBarWidget.Cast");
+    AddCast<CToolbarWidget>(ns, "CToolbarWidget.Cast");
+    AddCast<CImageBoxWidget>(ns, "CImageBoxWidget.Cast");
+    AddCast<CWindow>(ns, "CWindow.Cast");
+}
+
 } // namespace
 
 mluabind::Namespace BindGui()
@@ -253,6 +415,8 @@ mluabind::Namespace BindGui()
     ns.AddFunction(mluabind::Function("CCursor.Instance", &CCursor::Instance));
     ns.AddFunction(mluabind::Function("g_Cursor.Instance", &CCursor::Instance));
     ns.AddClass(Class<CWidgetManager>("CWidgetManager").Method("GetKeyboardState", &CWidgetManager::GetKeyboardState));
+    BindEffects(ns);
+    BindControls(ns);
     return ns;
 }
 

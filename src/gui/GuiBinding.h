@@ -7,8 +7,10 @@ namespace ox::gui {
 
 // "gui": the key codes OX_* and the Justify values; CBaseWidget and CWidget with their
 // pointer classes CBaseWidgetPtrT and CWidgetPtrT; CBaseWindow, CWindow, CLuaWidget; CCursor
-// with CCursor.Instance and g_Cursor.Instance; CWidgetManager. Methods that take a window
-// move a script-made window into the GUI's keeping.
+// with CCursor.Instance and g_Cursor.Instance; CWidgetManager; the effects (CEffect with
+// CEffectPtrT, CPositionChangeEffect, CColorChangeEffect, CFlagsChangeEffect) and the basic
+// controls. Methods that take a window, a widget or an effect move a script-made one into the
+// GUI's keeping.
 mluabind::Namespace BindGui();
 
 // The GUI's whole vocabulary under "ox.gui": BindGui's names, the insets IntInsets and

@@ -11,6 +11,10 @@
 #include <functional>
 #include <string>
 
+namespace ox::graphics {
+struct CFont;
+}
+
 namespace ox::gui {
 
 struct GuiServices {
@@ -21,8 +25,12 @@ struct GuiServices {
     std::function<bool()> isFullscreen;
     // Plays a declared sound by id with its default parameters.
     std::function<void(const std::string& id)> playSound;
+    // Whether a sound of the id is declared; without it descriptions aren't checked for sounds.
+    std::function<bool(const std::string& id)> isSound;
     // A new effect of a registered name, or null for an unknown name.
     std::function<EffectPtrT(const wstring& name)> createEffect;
+    // A declared font by id, or null: what labels and check boxes write with.
+    std::function<const graphics::CFont*(const char* id)> findFont;
 };
 
 GuiServices& GetGuiServices();

@@ -1,6 +1,15 @@
 #include "gui/WidgetFactory.h"
 
 #include "gui/LuaWidget.h"
+#include "gui/controls/ButtonWidget.h"
+#include "gui/controls/CheckboxWidget.h"
+#include "gui/controls/ClipWidget.h"
+#include "gui/controls/ImageBoxWidget.h"
+#include "gui/controls/ImageWidget.h"
+#include "gui/controls/LabelWidget.h"
+#include "gui/controls/ProgressBarWidget.h"
+#include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ToolbarWidget.h"
 
 namespace ox::gui {
 
@@ -46,10 +55,18 @@ CWidgetFactory& GetWidgetFactory()
 
 void RegisterFrameworkWidgets(CWidgetFactory& factory)
 {
-    // In the framework's order: label, image, button, checkbox, scroll, list, combo box,
-    // edit, slider, tab, table, image box, radio group and progress bar widgets come with the
-    // controls; then the Lua widget; the clip, toolbar and tree widgets come with theirs.
+    // In the framework's order. The scroll, list, combo box, edit, slider, tab, table and
+    // tree widgets join at their places when their classes exist.
+    factory.RegisterWidget<CLabelWidget>("label_widget");
+    factory.RegisterWidget<CImageWidget>("image_widget");
+    factory.RegisterWidget<CButtonWidget>("button_widget");
+    factory.RegisterWidget<CCheckboxWidget>("checkbox_widget");
+    factory.RegisterWidget<CImageBoxWidget>("image_box_widget");
+    factory.RegisterWidget<CRadioButtonGroupWidget>("radio_group_widget");
+    factory.RegisterWidget<CProgressBarWidget>("progress_bar_widget");
     factory.RegisterWidget<CLuaWidget>("lua_widget");
+    factory.RegisterWidget<CClipWidget>("clip_widget");
+    factory.RegisterWidget<CToolbarWidget>("toolbar_widget");
 }
 
 } // namespace ox::gui

@@ -7,6 +7,8 @@
 #include "gui/GuiServices.h"
 #include "gui/TextWidget.h"
 #include "gui/WidgetFactory.h"
+#include "gui/controls/ControlSupport.h"
+#include "gui/controls/ImageWidget.h"
 
 #include <algorithm>
 
@@ -46,8 +48,8 @@ void CWindow::Load(const core::CSettingsGroup& node, const core::CSettingsGroup&
     if (!tmplId.empty() && &tmpl == &core::CSettingsGroup::Empty())
         ReportElement(node, "no such window_template, defaults used: ", tmplId);
 
-    m_OpenSound = tmpl.GetValue("open_sound");
-    m_CloseSound = tmpl.GetValue("close_sound");
+    m_OpenSound = ReadSound(tmpl, "open_sound");
+    m_CloseSound = ReadSound(tmpl, "close_sound");
     m_ShowEffect = core::ReadWString(tmpl, "show_effect");
     m_HideEffect = core::ReadWString(tmpl, "hide_effect");
     ReadChecked(tmpl, "tile_step_x", m_TileStepX, 0, kMaxTileStep);
@@ -142,6 +144,8 @@ void CWindow::SetSize(float width, float height)
 
 misc::FloatVector CWindow::GetPreferredSize() const
 {
+    if (const auto* image = dynamic_cast<const CImageWidget*>(m_Background.get()))
+        return image->GetImage().GetTextureSize();
     return m_Background ? m_Background->GetPreferredSize() : FloatVector();
 }
 

@@ -67,13 +67,17 @@ struct TextProbe : ox::gui::CWidget, ox::gui::ITextWidget {
     void ResizeToFitText() override { SetSize(8.0f * static_cast<float>(text.size()), 16); }
 };
 
-// A widget kind for the length of a test; what was registered before comes back.
+// A widget kind for the length of a test (none with an empty creator); what was registered
+// before comes back.
 class ScopedKind {
 public:
     ScopedKind(const char* name, ox::gui::CWidgetFactory::CreatorT creator)
         : m_Name(name), m_Previous(ox::gui::GetWidgetFactory().GetCreator(name))
     {
-        ox::gui::GetWidgetFactory().RegisterWidget(name, std::move(creator));
+        if (creator)
+            ox::gui::GetWidgetFactory().RegisterWidget(name, std::move(creator));
+        else
+            ox::gui::GetWidgetFactory().UnregisterWidget(name);
     }
     ~ScopedKind()
     {

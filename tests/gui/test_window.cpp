@@ -186,6 +186,7 @@ TEST_F(WindowTest, MissingTemplatesAndPartsAreLoggedAndTheWindowWorks)
     EXPECT_EQ(window->GetHooks().GetLua(), nullptr);
 
     // A background kind nobody registered; a sound and an effect nobody plays, said once.
+    oxtest::ScopedKind none("image_widget", nullptr);
     auto plain = LoadWindow(R"(<window window_template="t"/>
         <GUITemplates><window_template id="t" background="back" open_sound="ding" show_effect="swoosh"/></GUITemplates>)");
     EXPECT_TRUE(log.Contains("no widget kind for a part of the window, skipped: image_widget"));

@@ -125,5 +125,8 @@ end
 
 -- Players, options and records.
 ox.lua.CLua.GetLua("main").LoadScript("scripts/profiles.lua")
+-- The menus: the main menu, the options and the loading bar. They take Run over, after the
+-- players' own, so Play starts the level with the player's progress.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/menu.lua")
 -- What the engine offers scripts, walked once loading is complete (after Run).
 ox.lua.CLua.GetLua("main").LoadScript("scripts/engine_tour.lua")

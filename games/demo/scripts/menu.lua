@@ -1,0 +1,190 @@
+-- Lantern Demo: the menus. Once loading is over the bar in the first window fills while the
+-- menus are made, then the main menu fades in over that window: Play, Options, Profiles,
+-- Records and Quit, each with a tool tip. The windows are described in properties/gui.xml.
+-- scripts/main.lua loads this file last: Run shows the menu, and Play starts the game.
+
+Menu = Menu or {}
+
+local function text(value)
+    if type(value) == "userdata" then
+        return value.c_str()
+    end
+    return tostring(value)
+end
+
+local function say(line)
+    print("Menu: " .. line)
+end
+
+-- The game's own start: Run as main.lua gives it. This file takes Run over (again after a
+-- reload of main.lua, which gives it anew).
+if Run ~= Menu.Run then
+    Menu.gameRun = Run
+end
+
+-- The description of the window `id`, and the templates, or nil when there is none.
+function Menu.Describe(id)
+    if not g_Application then
+        return nil
+    end
+    local ok, node, templates = pcall(function()
+        local settings = g_Application.GetSettings()
+        return settings.GetChildByAttributeRef("window", "id", id, true), settings.GetChild("GUITemplates", false)
+    end)
+    if not ok then
+        say("the GUI description cannot be read: " .. tostring(node))
+        return nil
+    end
+    return node, templates
+end
+
+-- Makes the window `id` and opens it over `parent`, fading in. False when the description
+-- has no such window.
+function Menu.Open(parent, id)
+    local node, templates = Menu.Describe(id)
+    if not node or not parent then
+        say("no window \"" .. id .. "\" to open")
+        return false
+    end
+    local window = ox.gui.CWindow()
+    window.Load(node, templates)
+    window.UpdateLayout()
+    if id == "options" then
+        OptionsWindow.Show(window)
+    elseif id == "main_menu" then
+        -- The buttons of windows the game doesn't have are disabled.
+        for _, other in ipairs({ "profiles", "records" }) do
+            local button = ox.gui.CButtonWidget.Cast(window.GetWidget(other, true))
+            if button and Menu.found and Menu.found[other] == false then
+                button.DisableButton(true)
+            end
+        end
+    end
+    window.SetColor(0x00FFFFFF)
+    parent.AddChildWindow(window)
+    window.AddEffect(ox.gui.CColorChangeEffect(0xFFFFFFFF, 400, 0, "main"))
+    say("\"" .. id .. "\" opens")
+    return true
+end
+
+-- A window closes at the next update of the one under it.
+local function close(window)
+    window.AddFlags(ox.gui.CBaseWidget.FlagDead)
+end
+
+-- The steps the bar counts: each makes sure of one window the menus open.
+Menu.steps = { "main_menu", "options", "profiles", "records" }
+
+function Run()
+    if not (g_Application and g_Application.GetSettings) then
+        say("the application is not reachable from scripts: the game starts without a menu")
+        Menu.Play()
+        return
+    end
+    Menu.done = 0
+    Menu.found = {}
+end
+Menu.Run = Run
+
+-- The bar in the first window: one step a frame, then the main menu.
+LoadingProgress = LoadingProgress or {}
+
+function LoadingProgress.DoUpdate(self)
+    if not Menu.done or Menu.done > #Menu.steps then
+        return false
+    end
+    if Menu.done == #Menu.steps then
+        Menu.done = Menu.done + 1
+        -- Without a menu the game starts at once.
+        if not Menu.Open(g_Application.GetMainWindow(), "main_menu") then
+            Menu.Play()
+        end
+        return false
+    end
+    Menu.done = Menu.done + 1
+    local id = Menu.steps[Menu.done]
+    Menu.found[id] = Menu.Describe(id) ~= nil
+    local bar = ox.gui.CProgressBarWidget.Cast(self.GetWidget("progress"))
+    if bar then
+        bar.SetValue(Menu.done / #Menu.steps)
+    end
+    return false
+end
+
+-- Play: the level's own start when the game has one, else what Run did before the menus.
+function Menu.Play()
+    if StartGame then
+        StartGame()
+    elseif Menu.gameRun then
+        Menu.gameRun()
+    end
+end
+
+MainMenu = MainMenu or {}
+
+function MainMenu.OnChildAction(self, action, sender)
+    if text(action) ~= "pressed" then
+        return false
+    end
+    local id = text(sender.GetId())
+    say("pressed " .. id)
+    if id == "play" then
+        close(self)
+        Menu.Play()
+    elseif id == "options" or id == "profiles" or id == "records" then
+        Menu.Open(self, id)
+    elseif id == "quit" then
+        g_Application.Stop()
+    end
+    return true
+end
+
+-- The options: what the player's options hold when the window opens, applied with OK.
+OptionsWindow = OptionsWindow or {}
+
+local function options()
+    if k17 and k17.g_GameOptions then
+        return k17.g_GameOptions.Instance()
+    end
+    return nil
+end
+
+local function controls(window)
+    return ox.gui.CCheckboxWidget.Cast(window.GetWidget("fullscreen", true)),
+           ox.gui.CRadioButtonGroupWidget.Cast(window.GetWidget("difficulty", true))
+end
+
+-- A new options window shows the player's options.
+function OptionsWindow.Show(window)
+    local game = options()
+    local fullscreen, difficulty = controls(window)
+    if game and fullscreen and difficulty then
+        fullscreen.Check(game.GetFullScreenMode(), false)
+        difficulty.Check(game.GetDificultyLevel())
+    end
+end
+
+function OptionsWindow.OnChildAction(self, action, sender)
+    local what = text(action)
+    if what == "check_changed" or what == "change_checked" then
+        say(what .. " " .. text(sender.GetId()))
+        return true
+    end
+    if what ~= "pressed" or text(sender.GetId()) ~= "ok" then
+        return false
+    end
+    local fullscreen, difficulty = controls(self)
+    local game = options()
+    if game and fullscreen and difficulty then
+        game.SetFullScreenMode(fullscreen.IsChecked())
+        game.SetDificultyLevel(difficulty.GetChecked())
+        game.ApplyOptionsChanges()
+        game.UpdateLocalSettings()
+        game.Save()
+        say("options applied")
+    else
+        say("no game options to apply")
+    end
+    close(self)
+    return true
+end
