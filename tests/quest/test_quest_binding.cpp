@@ -1,5 +1,6 @@
 // The quest tree from Lua: building a scene with the bound classes, walking its lists, and
 // the reference counts of objects a script holds while the tree lets them go.
+#include "gui/GuiBinding.h"
 #include "lua/LuaTestHost.h"
 #include "lua/mluabind/StdBinding.h"
 #include "quest/Area.h"
@@ -31,6 +32,8 @@ struct QuestBinding : ::testing::Test {
     void SetUp() override
     {
         host.Declare([] { return mluabind::BindStdStrings(); });
+        // Quest widgets derive from the GUI's.
+        host.Declare([] { return mluabind::Namespace("ox").Merge(ox::gui::BindGui()); });
         host.Declare([] { return BindQuestClasses(); });
         host.Declare([] {
             mluabind::Namespace test("test");
