@@ -242,6 +242,7 @@ mluabind::Namespace PointersAndWalks()
     ns.AddClass(mluabind::IntrusivePtrClass<CBaseSceneObject>("CBaseSceneObjectPtrT"));
     ns.AddClass(mluabind::IntrusivePtrClass<CLevel>("CLevelPtrT"));
     ns.AddClass(mluabind::IntrusivePtrClass<CSceneGroup>("CSceneGroupPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CSceneObject>("CSceneObjectPtrT"));
     ns.AddClass(mluabind::IntrusivePtrClass<CScene>("CScenePtrT"));
     ns.AddClass(mluabind::GenericIteratorClass<CQuest::LevelsListT>("CQuest.LevelIteratorT"));
     ns.AddClass(mluabind::GenericIteratorClass<CLevel::ScenesListT>("CLevel.SceneIteratorT"));
@@ -429,6 +430,23 @@ void BindFramework(mluabind::CHost& host)
     host.EndBinding();
 }
 
+void BindMissingGeometry(mluabind::CHost& host)
+{
+    if (host.FindClass(typeid(ox::misc::IntVector)))
+        return;
+    auto vector = [](auto tag, const char* name) {
+        using V = decltype(tag);
+        using T = decltype(V::X);
+        return &Class<V>(name).template Constructor<>().template Constructor<T, T>().Member("X", &V::X).Member("Y", &V::Y);
+    };
+    host.BeginBinding();
+    mluabind::Namespace misc("ox.misc");
+    misc.AddClass(*vector(ox::misc::IntVector(), "IntVector"));
+    misc.AddClass(*vector(ox::misc::FloatVector(), "FloatVector"));
+    host.Bind(misc);
+    host.EndBinding();
+}
+
 int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, const std::string& a,
                const ox::core::CSettings* settings, const std::string& initScript, const ox::wstring& b,
                const std::string& c, bool d)
@@ -437,6 +455,7 @@ int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, cons
     // Quest classes derive from framework classes, which must be known first.
     if (!lua->FindClass(typeid(ox::lua::CLua)))
         BindFramework(*lua);
+    BindMissingGeometry(*lua);
     lua->BeginBinding();
     lua->Bind(BindQuestClasses());
     lua->EndBinding();

@@ -36,6 +36,10 @@ mluabind::Namespace BindQuestClasses();
 // mode on its own.
 void BindFramework(mluabind::CHost& host);
 
+// The points the click road hands to scripts (ox.misc.IntVector, FloatVector with X and Y),
+// for a host whose framework vocabulary lacks them.
+void BindMissingGeometry(mluabind::CHost& host);
+
 // Starts a level in its Lua host (the one listed as qe_level): binds the framework's
 // vocabulary when the host lacks it, then "qe"; defines the global __g_InitScript as a
 // function with `initScript` as its body; loads scripts/game_engine/quest.lua; and returns
