@@ -318,3 +318,37 @@ TEST_F(SceneWidgetTest, ACloseUpOpensWithItsBorderTakesClicksAndClosesByItsButto
     widget->CloseChildScenes();
     EXPECT_EQ(Calls(), "");
 }
+
+TEST_F(SceneWidgetTest, BadScriptsAndHintsAreReportedAndTheLevelGoesOn)
+{
+    oxtest::LogCapture log;
+    // A click script that raises: reported, and the click road ends as ever.
+    scene->IsContentObject("front")->SetLuaScript("note('front') error('boom')", B::ScriptMouseClick);
+    ClickScene(65, 65);
+    EXPECT_EQ(Calls(), "cursor front | pos 115,105 | front | wrong 115,105 | clear");
+    ASSERT_EQ(boxes.Boxes().size(), 1u);
+    EXPECT_NE(boxes.Boxes()[0].text.find("boom"), std::string::npos) << LuaErrors();
+    ClickScene(100, 100);
+    EXPECT_EQ(Calls(), "cursor back | pos 150,140 | back | wrong 150,140 | clear");
+
+    // A hint whose text is not in the string table: a log line, and the table's own text shows.
+    scene->IsContentObject("back")->SetHint("$999");
+    oxtest::SendMove(*platform, 50 + 65, 40 + 65);
+    oxtest::SendMove(*platform, 50 + 100, 40 + 100);
+    EXPECT_TRUE(log.Contains("hint '$999'")) << "no log line for the missing hint";
+    EXPECT_FALSE(g_Cursor::Instance().GetHintText().empty());
+
+    // A close-up whose click script closes it: the script goes on, the widget goes at the update.
+    SceneWidgetPtrT child(new CSceneWidget());
+    child->SetScene(closeup.get());
+    widget->AddWidget(child);
+    closeup->IsContentObject("ring")->SetLuaScript(
+        "quest.SetModifyFlag(true) main_widget.CloseChildScenes() note('after ' .. tostring(self.GetId().c_str()))",
+        B::ScriptMouseClick);
+    Calls();
+    oxtest::SendClick(*platform, 50 + 150 + 100, 40 + 120 + 50);
+    EXPECT_EQ(Calls(), "cursor ring | pos 300,210 | closed closeup | changed | after ring | clear");
+    app->Update();
+    EXPECT_EQ(child->GetParentWidget(), nullptr);
+    EXPECT_EQ(boxes.Boxes().size(), 1u) << LuaErrors();
+}
