@@ -22,13 +22,15 @@ namespace qe {
 class CLevel;
 
 // "qe": CTreeNode, CBaseSceneObject, CSceneGroup, CSceneObject, CObject, CAreaPoint,
-// CImageObject, CClipObject, CArea, CQuest, CLevel, CScene; CAreaPointPtrT,
-// CBaseSceneObjectPtrT, CLevelPtrT, CSceneGroupPtrT, CScenePtrT; the list walks
-// CQuest.LevelIteratorT, CLevel.SceneIteratorT, CArea.PointIteratorT and
-// CSceneGroup.GroupChildIteratorT (which also walks a scene's lists); the functions
-// GetClipTime, Clip_GetObjectById and TryAlpha.
-// GetClipTime, Clip_GetObjectById, TryAlpha, StartLevel and RunObjectScript; the nested
-// table CSceneWidget with ClearScriptCache.
+// CImageObject, CClipObject, CArea, CQuest, CLevel, CScene; the objects box (CObjectsBox,
+// BoxItem), the scene widget, the objects box widget and the game cursor (CSceneWidget,
+// CObjectsBoxWidget, CCursor); their pointer classes (CBaseSceneObjectPtrT, ...); the list walks
+// CQuest.LevelIteratorT, CLevel.SceneIteratorT, CArea.PointIteratorT,
+// CSceneGroup.GroupChildIteratorT (which also walks a scene's lists) and
+// CObjectsBox.ObjectsListIteratorT; the singletons g_Cursor, g_LuaThreadManager and g_QuestData
+// and CSceneWidget.ClearScriptCache; the functions GetClipTime, Clip_GetObjectById, TryAlpha,
+// StartLevel, RunObjectScript, OnClose, LoadSceneChild_, FindObjectInventCondition,
+// FindObjectCursorInventState, StringFormat (a text or one to three numbers) and ReplaceDollarByS.
 mluabind::Namespace BindQuestClasses();
 
 // The framework's vocabulary, which the quest classes build on: std strings and "ox" (audio

@@ -134,3 +134,36 @@ TEST_F(QuestBinding, ScriptsReachTheQuestDataAndTheThreadManager)
     g_QuestData::Instance().SetBlock({});
     EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
 }
+
+TEST_F(QuestBinding, TheInventoryCursorAndSceneWidgetNamesAndTheTextHelpers)
+{
+    EXPECT_EQ(host.Run(R"(
+        local names = {}
+        for _, path in ipairs({'CSceneWidget.ClearScriptCache', 'g_Cursor.Instance', 'g_QuestData.Instance',
+                               'g_LuaThreadManager.Instance', 'FindObjectInventCondition', 'FindObjectCursorInventState',
+                               'OnClose', 'LoadSceneChild_', 'StringFormat', 'ReplaceDollarByS'}) do
+            local value = qe
+            for part in path:gmatch('[^.]+') do value = value and value[part] end
+            if value == nil then table.insert(names, path) end
+        end
+        for _, class in ipairs({'CObjectsBox', 'BoxItem', 'CSceneWidget', 'CObjectsBoxWidget', 'CCursor',
+                                'CObjectsBoxPtrT', 'CSceneWidgetPtrT', 'CObjectsBoxWidgetPtrT', 'CCursorPtrT',
+                                'CSceneObjectPtrT'}) do
+            if qe[class] == nil then table.insert(names, class) end
+        end
+        return 'missing: ' .. table.concat(names, ' '))"),
+              "missing: ");
+    EXPECT_EQ(host.Run("local box = qe.CObjectsBox() "
+                       "local key = qe.CImageObject() key.SetId('key') "
+                       "box.InsertObject(qe.CBaseSceneObjectPtrT(key), nil) "
+                       "local cursor = qe.g_Cursor.Instance() cursor.SetCursorObject(key) "
+                       "local drawn = cursor.GetCursorObject().GetId().c_str() cursor.ClearCursor(true) "
+                       "return drawn .. ' ' .. box.GetObject(0).InventState.GetId().c_str() .. ' ' .. "
+                       "tostring(box.FindObjectInBox('key')) .. ' ' .. tostring(box.GetObject(1))"),
+              "key key true nil");
+    EXPECT_EQ(host.Run("return qe.StringFormat(std.wstring('%d of %d'), 3, 9).c_str() .. ' ' .. "
+                       "qe.StringFormat(std.wstring('<%s>'), std.wstring('gem')).c_str() .. ' ' .. "
+                       "qe.ReplaceDollarByS(std.wstring('$1$')).c_str()"),
+              "3 of 9 <gem> S1S");
+    EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
+}
