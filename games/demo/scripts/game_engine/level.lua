@@ -36,6 +36,8 @@ end
 -- A new level: nothing found, an empty box, no window yet.
 function L.Reset(level)
     L.level = level
+    -- Areas are places to click, not pictures.
+    level.SetShowChildSceneAreas(false)
     L.found, L.count = {}, 0
     L.window, L.picked, L.modified = nil, false, false
     box = qe.CObjectsBox()
