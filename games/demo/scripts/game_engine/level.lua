@@ -98,7 +98,10 @@ function find(self)
         return
     end
     quest.SetModifyFlag(true)
+    local hint = text(cursor().GetHintText())
     self.RaiseObjectFlag(Removed)
+    -- Its hint goes with it.
+    L.level.UpdateFocusedObject(nil)
     L.found[id] = true
     L.count = L.count + 1
     local entry = widget("find_" .. id)
@@ -106,8 +109,7 @@ function find(self)
         entry.AddFlags(Hidden)
     end
     sound("found")
-    print(string.format("Lantern Demo: found %s (%d/%d), hint \"%s\"", id, L.count, #L.to_find,
-                        text(cursor().GetHintText())))
+    print(string.format("Lantern Demo: found %s (%d/%d), hint \"%s\"", id, L.count, #L.to_find, hint))
     L.level.RunLevelScript()
 end
 
