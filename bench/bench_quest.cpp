@@ -2,7 +2,9 @@
 // vertices, and a hit test whose point lies on no object, through all of them (half of
 // them cover the point with a transparent hole, so their pixel is asked of the alpha-mask
 // store). A level of 10 scenes and 2,000 objects built from the quest block; a frame of the
-// demo's scheduler with 1,000 live script threads that each wait one frame.
+// demo's scheduler with 1,000 live script threads that each wait one frame. One click from
+// the widget manager through a window and a scene widget to a started script: the walk
+// passes every object of the scene to the area at the back.
 #include "NullBackend.h"
 #include "core/TexturesAlpha.h"
 #include "core/TexturesAlphaWriter.h"
@@ -10,7 +12,12 @@
 #include "graphics/Renderer.h"
 #include "graphics/Texture.h"
 #include "core/Settings.h"
+#include "core/TextureManager.h"
 #include "core/TimeManager.h"
+#include "gui/WidgetManager.h"
+#include "gui/Window.h"
+#include "quest/Area.h"
+#include "quest/SceneWidget.h"
 #include "lua/Lua.h"
 #include "lua/LuaBinding.h"
 #include "lua/mluabind/StdBinding.h"
@@ -200,20 +207,30 @@ static void BM_CreateLevel(benchmark::State& state)
 }
 BENCHMARK(BM_CreateLevel)->Unit(benchmark::kMillisecond);
 
-static void BM_ManageThreads(benchmark::State& state)
+namespace {
+
+// The level's vocabulary and the demo's scheduler in a host.
+void BindLevelHost(ox::lua::CLua& lua)
 {
-    ox::core::CTimeManager time;
-    ox::core::CGroupTimer* clock = time.AttachGroupTimer("bench_level", nullptr);
-    ox::lua::CLua lua("bench_threads", false);
+    BindFramework(lua);
+    BindMissingGeometry(lua);
     lua.BeginBinding();
-    lua.Bind(mluabind::BindStdStrings());
-    lua.Bind(mluabind::Namespace("ox").Merge(ox::lua::BindLuaClasses()).Merge(ox::lua::BindGroupTimers()));
     lua.Bind(BindQuestClasses());
     lua.EndBinding();
     std::ifstream file(std::string(OX_DEMO_GAME) + "/scripts/game_engine/quest.lua");
     std::stringstream scheduler;
     scheduler << file.rdbuf();
     lua.Run(scheduler.str());
+}
+
+} // namespace
+
+static void BM_ManageThreads(benchmark::State& state)
+{
+    ox::core::CTimeManager time;
+    ox::core::CGroupTimer* clock = time.AttachGroupTimer("bench_level", nullptr);
+    ox::lua::CLua lua("bench_threads", false);
+    BindLevelHost(lua);
     CLuaThreadManager& manager = g_LuaThreadManager::Instance();
     manager.SetLua(lua);
     manager.SetTimer(clock);
@@ -235,5 +252,55 @@ static void BM_ManageThreads(benchmark::State& state)
     state.SetItemsProcessed(state.iterations() * 1000);
 }
 BENCHMARK(BM_ManageThreads)->Unit(benchmark::kMicrosecond);
+
+static void BM_ClickRoad(benchmark::State& state)
+{
+    SceneBench bench;
+    // The scene widget asks the texture manager's masks, which keep using the bytes in place.
+    static std::vector<uint8_t> masks;
+    masks = bench.maskBytes;
+    ox::core::CTextureManager::Instance().GetTexturesAlpha().LoadFromMemory(masks.data(), masks.size());
+    bench.scene->SetSize({1024, 768});
+    AreaPtrT area(new CArea());
+    area->SetId("target");
+    for (FloatVector p : {FloatVector(500, 370), FloatVector(530, 370), FloatVector(530, 400), FloatVector(500, 400)})
+        area->InsertPoint(AreaPointPtrT(new CAreaPoint(p)), area->Points().empty() ? nullptr : area->Points().back().get());
+    area->SetLuaScript("clicks = clicks + 1 quest.SetModifyFlag(true)", CBaseSceneObject::ScriptMouseClick);
+    bench.scene->InsertArea(area, nullptr);
+
+    ox::core::CTimeManager time;
+    ox::lua::CLua lua("qe_level", false);
+    BindLevelHost(lua);
+    lua.Run("clicks = 0 function quest.SetModifyFlag(f) modified = f end function quest.GetModifyFlag() return modified end "
+            "function quest.SetClickPos(p) end function wrong_click(p) end function clear_cursor() end");
+    CLuaThreadManager& manager = g_LuaThreadManager::Instance();
+    manager.SetLua(lua);
+    manager.SetTimer(time.AttachGroupTimer("bench_clicks", nullptr));
+
+    ox::gui::CWidgetManager widgets;
+    ox::gui::WindowPtrT window(new ox::gui::CWindow("bench"));
+    window->SetSize(1024, 768);
+    SceneWidgetPtrT sceneWidget(new CSceneWidget());
+    sceneWidget->SetScene(bench.scene.get());
+    window->AddWidget(sceneWidget);
+    widgets.SetMainWindow(window);
+    widgets.Update();
+    const ox::misc::IntVector at(static_cast<int>(kPoint.X), static_cast<int>(kPoint.Y));
+    for (auto _ : state) {
+        widgets.OnMouseDown(at, ox::gui::LeftButton, 0);
+        manager.ManageThreads();
+    }
+    lua_State* L = lua.GetLuaState();
+    lua_getglobal(L, "clicks");
+    const double clicks = lua_tonumber(L, -1);
+    lua_pop(L, 1);
+    manager.Clear();
+    manager.SetTimer(nullptr);
+    CSceneWidget::ClearScriptCache();
+    if (clicks != static_cast<double>(state.iterations()))
+        state.SkipWithError("every click must start the area's script once");
+    state.SetItemsProcessed(state.iterations() * kObjects);
+}
+BENCHMARK(BM_ClickRoad)->Unit(benchmark::kMicrosecond);
 
 BENCHMARK_MAIN();

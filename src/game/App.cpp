@@ -14,6 +14,7 @@
 #include "game/RecordTable.h"
 #include "gui/Cursor.h"
 #include "gui/GuiServices.h"
+#include "gui/WidgetFactory.h"
 #include "lua/LuaHeap.h"
 #include "graphics/Font.h"
 #include "misc/Unicode.h"
@@ -24,6 +25,7 @@
 #include "quest/LuaThreadManager.h"
 #include "quest/QuestBinding.h"
 #include "quest/QuestData.h"
+#include "quest/SceneWidget.h"
 #include "sound/AudioManager.h"
 #include "sound/SoundDeclarations.h"
 
@@ -160,6 +162,9 @@ bool CApp::Init()
                              "properties/gui.xml"})
         m_Settings.LoadXml(file);
 
+    // The quest's widget kinds, and the scene widget and game cursor serving the quest tree.
+    qe::RegisterQuestWidgets(gui::GetWidgetFactory());
+    qe::ConnectQuestServices();
     m_Lua = std::make_unique<lua::CLua>("main", true);
     BindScripts();
 

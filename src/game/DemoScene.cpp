@@ -12,6 +12,7 @@
 #include "misc/StringTable.h"
 #include "quest/Area.h"
 #include "quest/ClipObject.h"
+#include "quest/GameCursor.h"
 #include "quest/ImageObject.h"
 
 #include <cmath>
@@ -140,6 +141,17 @@ private:
     std::string m_Dialog;
 };
 
+// The top layer of the level's window: the game cursor (the object on the pointer and the
+// hint) drawn over everything. It takes no input.
+class CDemoCursorLayer : public gui::CWidget {
+public:
+    void DoDraw(graphics::CRenderer& r) override
+    {
+        CWidget::DoDraw(r);
+        qe::g_Cursor::Instance().Draw(&r);
+    }
+};
+
 } // namespace
 
 CDemoScene::CDemoScene(graphics::CRenderer& renderer) : m_Renderer(renderer), m_Pixels(MakeTile())
@@ -184,6 +196,7 @@ void CDemoScene::LoadPanel(const core::CSettingsGroup& gui, const core::CSetting
 {
     gui::CWidgetFactory& factory = gui::GetWidgetFactory();
     factory.RegisterWidget<CDemoBoxWidget>("demo_box_widget");
+    factory.RegisterWidget<CDemoCursorLayer>("demo_cursor_layer");
     m_Panel = factory.Create("demo_box_widget", gui.GetChildByAttribute("demo_box_widget", "id", "demo_panel"),
                              templates);
     m_Panel->UpdateLayout();

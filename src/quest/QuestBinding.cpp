@@ -14,13 +14,19 @@
 #include "quest/Area.h"
 #include "quest/ClipObject.h"
 #include "quest/ImageObject.h"
+#include "quest/GameCursor.h"
 #include "quest/LuaThreadManager.h"
 #include "quest/ObjectScripts.h"
 #include "quest/QuestData.h"
 #include "quest/PixelTest.h"
 #include "quest/Quest.h"
+#include "quest/ObjectsBox.h"
 #include "quest/SceneGroup.h"
+#include "quest/SceneWidget.h"
+#include "misc/Unicode.h"
 #include "sound/SoundBinding.h"
+
+#include <algorithm>
 
 namespace qe {
 
@@ -237,6 +243,7 @@ mluabind::Namespace PointersAndWalks()
     ns.AddClass(mluabind::IntrusivePtrClass<CBaseSceneObject>("CBaseSceneObjectPtrT"));
     ns.AddClass(mluabind::IntrusivePtrClass<CLevel>("CLevelPtrT"));
     ns.AddClass(mluabind::IntrusivePtrClass<CSceneGroup>("CSceneGroupPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CSceneObject>("CSceneObjectPtrT"));
     ns.AddClass(mluabind::IntrusivePtrClass<CScene>("CScenePtrT"));
     ns.AddClass(mluabind::GenericIteratorClass<CQuest::LevelsListT>("CQuest.LevelIteratorT"));
     ns.AddClass(mluabind::GenericIteratorClass<CLevel::ScenesListT>("CLevel.SceneIteratorT"));
@@ -258,8 +265,129 @@ mluabind::Namespace Singletons()
     ns.AddFunction(mluabind::Function("g_LuaThreadManager.Instance", &g_LuaThreadManager::Instance));
     ns.AddClass(Class<CQuestData>("CQuestData").Method("Load", &CQuestData::Load).Method("CreateLevel", &CQuestData::CreateLevel));
     ns.AddFunction(mluabind::Function("g_QuestData.Instance", &g_QuestData::Instance));
-    ns.AddFunction(mluabind::Function("CSceneWidget.ClearScriptCache", [] { GetObjectScripts().Clear(); }));
+    ns.AddFunction(mluabind::Function("CSceneWidget.ClearScriptCache", &CSceneWidget::ClearScriptCache));
     return ns;
+}
+
+mluabind::Namespace InventoryClasses()
+{
+    mluabind::Namespace ns;
+    using Box = CObjectsBox;
+    ns.AddClass(Class<Box>("CObjectsBox")
+                    .Constructor<>()
+                    .Method("Clear", &Box::Clear)
+                    .Method("EnumObjects", &Box::EnumObjects)
+                    .Method("GetObjects", &Box::GetObjects)
+                    .Method("GetObject", &Box::GetObject)
+                    .Method("FindObjectInBox", &Box::FindObjectInBox)
+                    .Method("InsertObject", &Box::InsertObject)
+                    .Method("RemoveObject", &Box::RemoveObject)
+                    .Method("SetItemNextState", &Box::SetItemNextState)
+                    .Method("SetItemStateById", &Box::SetItemStateById));
+    ns.AddClass(Class<BoxItem>("BoxItem").Member("Item", &BoxItem::Item).Member("InventState", &BoxItem::InventState));
+    ns.AddClass(mluabind::IntrusivePtrClass<Box>("CObjectsBoxPtrT"));
+    ns.AddClass(mluabind::GenericIteratorClass<Box::ObjectsListT>("CObjectsBox.ObjectsListIteratorT"));
+    ns.AddFunction(mluabind::Function("FindObjectInventCondition", &FindObjectInventCondition));
+    ns.AddFunction(mluabind::Function("FindObjectCursorInventState", &FindObjectCursorInventState));
+    return ns;
+}
+
+mluabind::Namespace WidgetClasses()
+{
+    mluabind::Namespace ns;
+    using W = CSceneWidget;
+    ns.AddClass(Class<W>("CSceneWidget")
+                    .BaseClass<ox::gui::CWidget>()
+                    .Constructor<>()
+                    .Method("SetScene", &W::SetScene)
+                    .Method("GetScene", &W::GetScene)
+                    .Method("GetSceneId", &W::GetSceneId)
+                    .Method("CloseChildScenes", &W::CloseChildScenes)
+                    .Method("CloseChildSceneById", &W::CloseChildSceneById)
+                    .Method("RunMouseCickScript", &W::RunMouseCickScript)
+                    .Method("RunIventoryClickScript", &W::RunIventoryClickScript)
+                    .Method("OnMouseDown", &W::OnMouseDown)
+                    .Method("OnMouseUp", &W::OnMouseUp)
+                    .Method("SetInitPos", &W::SetInitPos)
+                    .Method("GetInitPos", &W::GetInitPos)
+                    .Method("SetWorldInitPos", &W::SetWorldInitPos)
+                    .Method("GetWorldInitPos", &W::GetWorldInitPos)
+                    .Method("SetCloseButtonText", &W::SetCloseButtonText)
+                    .Method("UpdateCloseButtonPos", &W::UpdateCloseButtonPos)
+                    .Method("IsDead", &W::IsDead)
+                    .Method("DisableCloseButton", &W::DisableCloseButton)
+                    .Method("GetCloseButton", &W::GetCloseButton));
+    ns.AddClass(Class<CObjectsBoxWidget>("CObjectsBoxWidget").BaseClass<ox::gui::CLuaWidget>().Constructor<>());
+    ns.AddClass(mluabind::IntrusivePtrClass<W>("CSceneWidgetPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CObjectsBoxWidget>("CObjectsBoxWidgetPtrT"));
+    return ns;
+}
+
+mluabind::Namespace CursorClass()
+{
+    mluabind::Namespace ns;
+    using C = CCursor;
+    ns.AddClass(Class<C>("CCursor")
+                    .Method("SetCursorObject", &C::SetCursorObject)
+                    .Method("GetCursorObject", &C::GetCursorObject)
+                    .Method("ClearCursor", &C::ClearCursor)
+                    .Method("Draw", &C::Draw)
+                    .Method("SetWorkAreaSize", &C::SetWorkAreaSize)
+                    .Method("SetWorkAreaOffset", &C::SetWorkAreaOffset)
+                    .Method("SetIsDrag", &C::SetIsDrag)
+                    .Method("GetIsDrag", &C::GetIsDrag)
+                    .Method("SetShowHints", &C::SetShowHints)
+                    .Method("GetShowHints", &C::GetShowHints)
+                    .Method("SetDisableHints", &C::SetDisableHints)
+                    .Method("GetDisableHints", &C::GetDisableHints)
+                    .Method("SetHintOffset", &C::SetHintOffset)
+                    .Method("GetHintOffset", &C::GetHintOffset)
+                    .Method("SetHintText", &C::SetHintText)
+                    .Method("GetHintText", &C::GetHintText)
+                    .Method("SetHintFont", static_cast<void (C::*)(const std::string&)>(&C::SetHintFont))
+                    .Method("SetObjectWidth", &C::SetObjectWidth)
+                    .Method("SetCursorObjectScale", &C::SetCursorObjectScale)
+                    .Method("SetObjectOffset", &C::SetObjectOffset)
+                    .Method("SetPreObject", &C::SetPreObject)
+                    .Method("SetPreObjectOffset", &C::SetPreObjectOffset));
+    ns.AddClass(mluabind::IntrusivePtrClass<C>("CCursorPtrT"));
+    ns.AddFunction(mluabind::Function("g_Cursor.Instance", &g_Cursor::Instance));
+    return ns;
+}
+
+// Texts for scripts: a format of the wide formatter with one text or up to three numbers,
+// into a buffer of 1,023 characters.
+template <class... Args>
+ox::wstring Format(const ox::wstring& format, Args... args)
+{
+    ox::wchar buffer[1024];
+    ox::misc::StringFormat(buffer, 1024, format.c_str(), args...);
+    return buffer;
+}
+
+mluabind::Namespace TextFunctions()
+{
+    mluabind::Namespace ns;
+    ns.AddFunction(mluabind::Function("StringFormat", [](const ox::wstring& f, const ox::wstring& text) {
+        return Format(f, text.c_str());
+    }));
+    ns.AddFunction(mluabind::Function("StringFormat", [](const ox::wstring& f, int a) { return Format(f, a); }));
+    ns.AddFunction(mluabind::Function("StringFormat", [](const ox::wstring& f, int a, int b) { return Format(f, a, b); }));
+    ns.AddFunction(mluabind::Function("StringFormat", [](const ox::wstring& f, int a, int b, int c) {
+        return Format(f, a, b, c);
+    }));
+    ns.AddFunction(mluabind::Function("ReplaceDollarByS", [](ox::wstring text) {
+        std::replace(text.begin(), text.end(), u'$', u'S');
+        return text;
+    }));
+    return ns;
+}
+
+// quest.OnClose of a host, as the application asks it when the game closes.
+bool OnClose(ox::lua::CLua* lua)
+{
+    OX_CHECK_DATA(lua != nullptr, false);
+    return ox::lua::CallLuaFunction<bool>(lua, "quest.OnClose");
 }
 
 // An object's script of a kind, run as a scene widget runs it; scripts reach it while no
@@ -279,6 +407,9 @@ mluabind::Namespace BindQuestClasses()
     ns.AddClass(Class<CTreeNode>("CTreeNode"));
     ns.AddClass(BaseSceneObjectClass());
     ns.Merge(SceneObjectClasses()).Merge(TreeClasses()).Merge(PointersAndWalks()).Merge(Singletons());
+    ns.Merge(InventoryClasses()).Merge(WidgetClasses()).Merge(CursorClass()).Merge(TextFunctions());
+    ns.AddFunction(mluabind::Function("OnClose", &OnClose));
+    ns.AddFunction(mluabind::Function("LoadSceneChild_", &LoadSceneChild_));
     ns.AddFunction(mluabind::Function("GetClipTime", &GetClipTime));
     ns.AddFunction(mluabind::Function("Clip_GetObjectById", &Clip_GetObjectById));
     ns.AddFunction(mluabind::Function("TryAlpha", &TryAlpha));
@@ -292,6 +423,23 @@ void BindFramework(mluabind::CHost& host)
     ox::core::BindOX(host);
 }
 
+void BindMissingGeometry(mluabind::CHost& host)
+{
+    if (host.FindClass(typeid(ox::misc::IntVector)))
+        return;
+    auto vector = [](auto tag, const char* name) {
+        using V = decltype(tag);
+        using T = decltype(V::X);
+        return &Class<V>(name).template Constructor<>().template Constructor<T, T>().Member("X", &V::X).Member("Y", &V::Y);
+    };
+    host.BeginBinding();
+    mluabind::Namespace misc("ox.misc");
+    misc.AddClass(*vector(ox::misc::IntVector(), "IntVector"));
+    misc.AddClass(*vector(ox::misc::FloatVector(), "FloatVector"));
+    host.Bind(misc);
+    host.EndBinding();
+}
+
 int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, const std::string& a,
                const ox::core::CSettings* settings, const std::string& initScript, const ox::wstring& b,
                const std::string& c, bool d)
@@ -300,6 +448,7 @@ int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, cons
     // Quest classes derive from framework classes, which must be known first.
     if (!lua->FindClass(typeid(ox::lua::CLua)))
         BindFramework(*lua);
+    BindMissingGeometry(*lua);
     lua->BeginBinding();
     lua->Bind(BindQuestClasses());
     lua->EndBinding();

@@ -22,18 +22,24 @@ namespace qe {
 class CLevel;
 
 // "qe": CTreeNode, CBaseSceneObject, CSceneGroup, CSceneObject, CObject, CAreaPoint,
-// CImageObject, CClipObject, CArea, CQuest, CLevel, CScene; CAreaPointPtrT,
-// CBaseSceneObjectPtrT, CLevelPtrT, CSceneGroupPtrT, CScenePtrT; the list walks
-// CQuest.LevelIteratorT, CLevel.SceneIteratorT, CArea.PointIteratorT and
-// CSceneGroup.GroupChildIteratorT (which also walks a scene's lists); the functions
-// GetClipTime, Clip_GetObjectById and TryAlpha.
-// GetClipTime, Clip_GetObjectById, TryAlpha, StartLevel and RunObjectScript; the nested
-// table CSceneWidget with ClearScriptCache.
+// CImageObject, CClipObject, CArea, CQuest, CLevel, CScene; the objects box (CObjectsBox,
+// BoxItem), the scene widget, the objects box widget and the game cursor (CSceneWidget,
+// CObjectsBoxWidget, CCursor); their pointer classes (CBaseSceneObjectPtrT, ...); the list walks
+// CQuest.LevelIteratorT, CLevel.SceneIteratorT, CArea.PointIteratorT,
+// CSceneGroup.GroupChildIteratorT (which also walks a scene's lists) and
+// CObjectsBox.ObjectsListIteratorT; the singletons g_Cursor, g_LuaThreadManager and g_QuestData
+// and CSceneWidget.ClearScriptCache; the functions GetClipTime, Clip_GetObjectById, TryAlpha,
+// StartLevel, RunObjectScript, OnClose, LoadSceneChild_, FindObjectInventCondition,
+// FindObjectCursorInventState, StringFormat (a text or one to three numbers) and ReplaceDollarByS.
 mluabind::Namespace BindQuestClasses();
 
 // The framework's vocabulary, which the quest classes build on (ox.lua.BindOX). Binds in
 // declaration mode on its own.
 void BindFramework(mluabind::CHost& host);
+
+// The points the click road hands to scripts (ox.misc.IntVector, FloatVector with X and Y),
+// for a host whose framework vocabulary lacks them.
+void BindMissingGeometry(mluabind::CHost& host);
 
 // Starts a level in its Lua host (the one listed as qe_level): binds the framework's
 // vocabulary when the host lacks it, then "qe"; defines the global __g_InitScript as a

@@ -29,9 +29,8 @@ std::string ReadDemoScheduler()
 
 void BindAll(CLua& lua)
 {
+    BindFramework(lua);
     lua.BeginBinding();
-    lua.Bind(mluabind::BindStdStrings());
-    lua.Bind(mluabind::Namespace("ox").Merge(ox::lua::BindLuaClasses()).Merge(ox::lua::BindGroupTimers()));
     lua.Bind(BindQuestClasses());
     lua.EndBinding();
 }

@@ -32,9 +32,8 @@ struct ObjectScripts : ::testing::Test {
 
     void SetUp() override
     {
+        BindFramework(level);
         level.BeginBinding();
-        level.Bind(mluabind::BindStdStrings());
-        level.Bind(mluabind::Namespace("ox").Merge(ox::lua::BindLuaClasses()).Merge(ox::lua::BindGroupTimers()));
         level.Bind(BindQuestClasses());
         level.EndBinding();
         std::ifstream file(std::string(OX_DEMO_GAME) + "/scripts/game_engine/quest.lua");

@@ -38,13 +38,13 @@ TEST(OxdumpQuest, CompilesTheDemoQuestAsTheGameDoesAndShowsIt)
     data.SetBlock(std::vector<uint8_t>(written.begin(), written.end()));
     qe::LevelPtrT level(data.CreateLevel("level1"));
     ASSERT_TRUE(level);
-    EXPECT_EQ(level->EnumScenes(), 2u);
+    EXPECT_EQ(level->EnumScenes(), 3u);
     EXPECT_TRUE(level->FindObjectById("lamp_on", true, false));
 
     std::tie(status, text) = Oxdump(dir, "show '" + out + "'");
     EXPECT_EQ(status, 0) << text;
-    EXPECT_NE(text.find("level 'level1': 2 scenes"), std::string::npos) << text;
-    EXPECT_NE(text.find("scene 'main': flags 1, 5 objects, 1 areas"), std::string::npos) << text;
+    EXPECT_NE(text.find("level 'level1': 3 scenes"), std::string::npos) << text;
+    EXPECT_NE(text.find("scene 'garden': flags 1, 7 objects, 1 areas"), std::string::npos) << text;
 
     // A cut dump is described as damaged and refused.
     dir.Write("cut.bindump", written.substr(0, written.size() - 40));

@@ -1,5 +1,6 @@
 // The quest tree from Lua: building a scene with the bound classes, walking its lists, and
 // the reference counts of objects a script holds while the tree lets them go.
+#include "gui/GuiBinding.h"
 #include "lua/LuaTestHost.h"
 #include "lua/mluabind/StdBinding.h"
 #include "quest/Area.h"
@@ -31,6 +32,8 @@ struct QuestBinding : ::testing::Test {
     void SetUp() override
     {
         host.Declare([] { return mluabind::BindStdStrings(); });
+        // Quest widgets derive from the GUI's.
+        host.Declare([] { return mluabind::Namespace("ox").Merge(ox::gui::BindGui()); });
         host.Declare([] { return BindQuestClasses(); });
         host.Declare([] {
             mluabind::Namespace test("test");
@@ -129,5 +132,38 @@ TEST_F(QuestBinding, ScriptsReachTheQuestDataAndTheThreadManager)
     EXPECT_EQ(host.Run("return qe.g_QuestData.Instance().CreateLevel('none')"), "nil");
     EXPECT_EQ(host.Run("return qe.g_LuaThreadManager.Instance().GetElapsedTime()"), "0");
     g_QuestData::Instance().SetBlock({});
+    EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
+}
+
+TEST_F(QuestBinding, TheInventoryCursorAndSceneWidgetNamesAndTheTextHelpers)
+{
+    EXPECT_EQ(host.Run(R"(
+        local names = {}
+        for _, path in ipairs({'CSceneWidget.ClearScriptCache', 'g_Cursor.Instance', 'g_QuestData.Instance',
+                               'g_LuaThreadManager.Instance', 'FindObjectInventCondition', 'FindObjectCursorInventState',
+                               'OnClose', 'LoadSceneChild_', 'StringFormat', 'ReplaceDollarByS'}) do
+            local value = qe
+            for part in path:gmatch('[^.]+') do value = value and value[part] end
+            if value == nil then table.insert(names, path) end
+        end
+        for _, class in ipairs({'CObjectsBox', 'BoxItem', 'CSceneWidget', 'CObjectsBoxWidget', 'CCursor',
+                                'CObjectsBoxPtrT', 'CSceneWidgetPtrT', 'CObjectsBoxWidgetPtrT', 'CCursorPtrT',
+                                'CSceneObjectPtrT'}) do
+            if qe[class] == nil then table.insert(names, class) end
+        end
+        return 'missing: ' .. table.concat(names, ' '))"),
+              "missing: ");
+    EXPECT_EQ(host.Run("local box = qe.CObjectsBox() "
+                       "local key = qe.CImageObject() key.SetId('key') "
+                       "box.InsertObject(qe.CBaseSceneObjectPtrT(key), nil) "
+                       "local cursor = qe.g_Cursor.Instance() cursor.SetCursorObject(key) "
+                       "local drawn = cursor.GetCursorObject().GetId().c_str() cursor.ClearCursor(true) "
+                       "return drawn .. ' ' .. box.GetObject(0).InventState.GetId().c_str() .. ' ' .. "
+                       "tostring(box.FindObjectInBox('key')) .. ' ' .. tostring(box.GetObject(1))"),
+              "key key true nil");
+    EXPECT_EQ(host.Run("return qe.StringFormat(std.wstring('%d of %d'), 3, 9).c_str() .. ' ' .. "
+                       "qe.StringFormat(std.wstring('<%s>'), std.wstring('gem')).c_str() .. ' ' .. "
+                       "qe.ReplaceDollarByS(std.wstring('$1$')).c_str()"),
+              "3 of 9 <gem> S1S");
     EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
 }
