@@ -112,7 +112,8 @@ int PlayThePlayers()
     if (chooser->GetChildWindow() || !Click(chooser, "play"))
         return 14;
     frames(1);
-    if (loading->GetChildWindow())
+    // The chooser is gone (the main menu may have come over the first window meanwhile).
+    if (app.GetTopWindow()->GetId() == "profiles")
         return 15;
     loading->OnKeyDown('F', 0, 0, false);
     frames(1);

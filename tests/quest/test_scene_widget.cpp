@@ -23,6 +23,7 @@
 #include "support/TestSupport.h"
 
 #include <cstring>
+#include <optional>
 
 using namespace qe;
 using ox::lua::CLua;
@@ -104,7 +105,7 @@ struct SceneWidgetTest : ::testing::Test {
     oxtest::MessageCapture boxes;
     std::unique_ptr<ox::core::CApplication> app;
     oxtest::FakePlatform* platform = nullptr;
-    oxtest::ScopedKind button {"button_widget", oxtest::ScopedKind::Of<TestButton>()};
+    std::optional<oxtest::ScopedKind> button; // after the application, which registers the real one
     ox::graphics::CSurface holedSurface {8, 8}, solidSurface {8, 8};
     ox::graphics::CTexture holed {&holedSurface}, solid {&solidSurface};
     std::unique_ptr<CLua> lua;
@@ -124,6 +125,7 @@ struct SceneWidgetTest : ::testing::Test {
         platform = owned.get();
         app->SetSystemIntegration(std::move(owned));
         ASSERT_TRUE(app->Init());
+        button.emplace("button_widget", oxtest::ScopedKind::Of<TestButton>());
         app->GetRenderer()->SetSourceResolution(1024, 768);
         app->ChangeScreenMode(false, true, 1024, 768);
         RegisterQuestWidgets(ox::gui::GetWidgetFactory());

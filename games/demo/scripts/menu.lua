@@ -1,7 +1,8 @@
 -- Lantern Demo: the menus. Once loading is over the bar in the first window fills while the
 -- menus are made, then the main menu fades in over that window: Play, Options, Profiles,
 -- Records and Quit, each with a tool tip. The windows are described in properties/gui.xml.
--- scripts/main.lua loads this file last: Run shows the menu, and Play starts the game.
+-- scripts/main.lua loads it after the players' script: Run starts the game under the menu, and Play
+-- opens the level's window.
 
 Menu = Menu or {}
 
@@ -38,17 +39,26 @@ function Menu.Describe(id)
     return node, templates
 end
 
--- Makes the window `id` and opens it over `parent`, fading in. False when the description
--- has no such window.
-function Menu.Open(parent, id)
+-- The window `id` made from its description, or nil when the description has none.
+function Menu.Make(id)
     local node, templates = Menu.Describe(id)
-    if not node or not parent then
+    if not node then
         say("no window \"" .. id .. "\" to open")
-        return false
+        return nil
     end
     local window = ox.gui.CWindow()
     window.Load(node, templates)
     window.UpdateLayout()
+    return window
+end
+
+-- Makes the window `id` and opens it over `parent`, fading in. False when the description
+-- has no such window.
+function Menu.Open(parent, id)
+    local window = parent and Menu.Make(id)
+    if not window then
+        return false
+    end
     if id == "options" then
         OptionsWindow.Show(window)
     elseif id == "main_menu" then
@@ -76,6 +86,10 @@ end
 Menu.steps = { "main_menu", "options", "profiles", "records" }
 
 function Run()
+    -- The game starts under the menu: the music, the player's level, ready for Play.
+    if Menu.gameRun then
+        Menu.gameRun()
+    end
     if not (g_Application and g_Application.GetSettings) then
         say("the application is not reachable from scripts: the game starts without a menu")
         Menu.Play()
@@ -90,6 +104,10 @@ Menu.Run = Run
 LoadingProgress = LoadingProgress or {}
 
 function LoadingProgress.DoUpdate(self)
+    if Menu.playing then
+        Menu.PlayLevel()
+        return false
+    end
     if not Menu.done or Menu.done > #Menu.steps then
         return false
     end
@@ -111,13 +129,30 @@ function LoadingProgress.DoUpdate(self)
     return false
 end
 
--- Play: the level's own start when the game has one, else what Run did before the menus.
-function Menu.Play()
+-- Play: StartGame when the game defines one. Else the menu closes and, at the first window's
+-- next update, the level's window opens over that window, modal until the level is over;
+-- then the menu comes back.
+function Menu.Play(menu)
     if StartGame then
         StartGame()
-    elseif Menu.gameRun then
-        Menu.gameRun()
+        return
     end
+    if menu then
+        close(menu)
+    end
+    Menu.playing = true
+end
+
+function Menu.PlayLevel()
+    Menu.playing = false
+    local main = g_Application.GetMainWindow()
+    local window = Menu.Make("game")
+    if not window then
+        return
+    end
+    say("the level's window opens")
+    say("the level's window closed with " .. main.DoModal(window))
+    Menu.Open(main, "main_menu")
 end
 
 MainMenu = MainMenu or {}
@@ -129,8 +164,11 @@ function MainMenu.OnChildAction(self, action, sender)
     local id = text(sender.GetId())
     say("pressed " .. id)
     if id == "play" then
-        close(self)
-        Menu.Play()
+        Menu.Play(self)
+    elseif id == "profiles" and Profiles then
+        Profiles.OpenChooser()
+    elseif id == "records" and Profiles then
+        Profiles.OpenRecords()
     elseif id == "options" or id == "profiles" or id == "records" then
         Menu.Open(self, id)
     elseif id == "quit" then
