@@ -14,7 +14,9 @@ TEST(DemoContent, TexturesAndDumpsRegenerateByteForByte)
     const int status = system(command.c_str());
     ASSERT_EQ(WEXITSTATUS(status), 0) << oxtest::ReadFile(out / "log.txt");
     const char* files[] = {"textures/demo_spinner.png", "textures/demo_disc.png", "textures/demo_frame.png",
-                           "textures/demo_stone.pvr", "properties/resources.bindump",
+                           "textures/demo_stone.pvr", "textures/menu_button.png", "textures/menu_box.png",
+                           "textures/menu_tick.png", "textures/menu_bar_frame.png", "textures/menu_bar.png",
+                           "textures/menu_back.png", "textures/menu_tip_back.png", "properties/resources.bindump",
                            "properties/texturesalpha.bindump", "properties/clips.bindump"};
     for (const char* file : files) {
         ASSERT_TRUE(fs::exists(out / file)) << file;
