@@ -5,6 +5,7 @@
 #include "game/App.h"
 #include "gui/WidgetManager.h"
 #include "gui/Window.h"
+#include "DemoChild.h"
 #include "support/TestSupport.h"
 
 #include <sys/wait.h>
@@ -127,28 +128,11 @@ int PlayTheDemo()
 
 TEST(DemoWindow, ClicksAndKeysReachTheScriptsAndTheDialogIsModal)
 {
-    oxtest::TempDir dir;
-    const fs::path game = dir / "demo";
-    fs::copy(OX_DEMO_GAME, game, fs::copy_options::recursive);
-    fs::create_directories(dir / "xdg");
-    const pid_t pid = fork();
-    if (pid == 0) {
-        alarm(60); // a modal loop that never ends must not hang the tests
-        setenv("XDG_DATA_HOME", (dir / "xdg").c_str(), 1);
-        setenv("SDL_VIDEODRIVER", "offscreen", 1);
-        setenv("ALSOFT_DRIVERS", "null", 1);
-        if (chdir(game.c_str()) != 0)
-            _exit(101);
-        const int result = PlayTheDemo();
-        fflush(stdout);
-        _exit(result);
-    }
-    int status = 0;
-    ASSERT_EQ(waitpid(pid, &status, 0), pid);
-    ASSERT_TRUE(WIFEXITED(status)) << "signal " << WTERMSIG(status);
-    const std::string output = oxtest::ReadFile(game / "k17_stdout.txt");
-    const std::string errors = oxtest::ReadFile(game / "k17_stderr.txt");
-    ASSERT_EQ(WEXITSTATUS(status), 0) << output << errors;
+    oxtest::DemoChild demo;
+    const int result = demo.Run(&PlayTheDemo);
+    const std::string output = demo.Output();
+    const std::string errors = demo.Errors();
+    ASSERT_EQ(result, 0) << output << errors;
 
     // In order: the window's own hooks, the modal dialog taking every click until OK, the
     // result it left, and the window taking clicks again.

@@ -10,6 +10,7 @@
 #include "lua/Lua.h"
 #include "quest/GameCursor.h"
 #include "quest/QuestServices.h"
+#include "DemoChild.h"
 #include "support/TestSupport.h"
 
 #include <csignal>
@@ -142,34 +143,11 @@ int PlayTheLevel()
 
 TEST(LevelPlaythrough, TheDemoLevelIsPlayedToItsEndWithTheMouse)
 {
-    oxtest::TempDir dir;
-    const fs::path game = dir / "demo";
-    fs::copy(OX_DEMO_GAME, game, fs::copy_options::recursive);
-    fs::create_directories(dir / "xdg");
-    const pid_t pid = fork();
-    if (pid == 0) {
-        // A level window that never closes must not hang the tests; what the game printed
-        // is kept for the report.
-        signal(SIGALRM, [](int) {
-            fflush(stdout);
-            _exit(99);
-        });
-        alarm(60);
-        setenv("XDG_DATA_HOME", (dir / "xdg").c_str(), 1);
-        setenv("SDL_VIDEODRIVER", "offscreen", 1);
-        setenv("ALSOFT_DRIVERS", "null", 1);
-        if (chdir(game.c_str()) != 0)
-            _exit(101);
-        const int result = PlayTheLevel();
-        fflush(stdout);
-        _exit(result);
-    }
-    int status = 0;
-    ASSERT_EQ(waitpid(pid, &status, 0), pid);
-    const std::string output = oxtest::ReadFile(game / "k17_stdout.txt");
-    const std::string errors = oxtest::ReadFile(game / "k17_stderr.txt");
-    ASSERT_TRUE(WIFEXITED(status)) << "signal " << WTERMSIG(status) << "\n" << output << errors;
-    ASSERT_EQ(WEXITSTATUS(status), 0) << output << errors;
+    oxtest::DemoChild demo;
+    const int result = demo.Run(&PlayTheLevel);
+    const std::string output = demo.Output();
+    const std::string errors = demo.Errors();
+    ASSERT_EQ(result, 0) << output << errors;
 
     size_t at = 0;
     for (const char* line :

@@ -2,6 +2,7 @@
 // left the level, whose state went into their save file when the game closed.
 #include "game/App.h"
 #include "gui/Window.h"
+#include "DemoChild.h"
 #include "support/TestSupport.h"
 
 #include <signal.h>
@@ -127,26 +128,11 @@ int PlayThePlayers()
 
 TEST(DemoProfiles, ChooserAndRecordsWindowsTakeClicks)
 {
-    oxtest::TempDir dir;
-    const fs::path game = dir / "demo";
-    fs::copy(OX_DEMO_GAME, game, fs::copy_options::recursive);
-    fs::create_directories(dir / "xdg");
-    const pid_t pid = fork();
-    if (pid == 0) {
-        alarm(60);
-        setenv("XDG_DATA_HOME", (dir / "xdg").c_str(), 1);
-        setenv("SDL_VIDEODRIVER", "offscreen", 1);
-        setenv("ALSOFT_DRIVERS", "null", 1);
-        if (chdir(game.c_str()) != 0)
-            _exit(101);
-        const int result = PlayThePlayers();
-        fflush(stdout);
-        _exit(result);
-    }
-    int status = 0;
-    ASSERT_EQ(waitpid(pid, &status, 0), pid);
-    const std::string output = oxtest::ReadFile(game / "k17_stdout.txt");
-    ASSERT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status << "\n" << output;
+    oxtest::DemoChild demo;
+    const oxtest::TempDir& dir = demo.dir;
+    const int result = demo.Run(&PlayThePlayers);
+    const std::string output = demo.Output();
+    ASSERT_EQ(result, 0) << output;
     size_t at = 0;
     for (const char* line : {"the players' chooser opens", "Player 1 starts level1", "the records open",
                              "level1 finished by Player 1", "the records open", "Player 1's level saved"}) {
