@@ -95,8 +95,6 @@ public:
     void ReleaseTemporaries(size_t depth);
     // Changes whenever the class registry of any host changes; caches compare it.
     uint64_t GetStamp() const { return m_Stamp; }
-    // A shared empty table: the environment of every fresh variable (see Dispatch.cpp).
-    int GetFreshEnvironmentRef() const { return m_FreshEnvRef; }
     i::CallFrame* GetFrame() const { return m_Frame; }
     void SetFrame(i::CallFrame* frame) { m_Frame = frame; }
 
@@ -119,7 +117,6 @@ private:
     i::DeclarationArena* m_DeclarationArena;
     bool m_OwnsState;
     uint64_t m_Stamp;
-    int m_FreshEnvRef;
     i::CallFrame* m_Frame = nullptr;
 
     static CHost* m_CurrentBindingHost;

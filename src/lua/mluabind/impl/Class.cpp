@@ -69,6 +69,92 @@ const MethodRun* GenericClass::FindRun(const char* name)
     return it == m_Runs.end() || it->second.Count == 0 ? nullptr : &it->second;
 }
 
+namespace {
+
+constexpr int MaxSearchDepth = 32;
+
+// The overloads of `name` in the class itself, else the first found through its adapters
+// in map order; `path` gets the adapters on the way.
+bool FindMethodPath(CHost& host, GenericClass* cls, const char* name, int depth, Resolution& found)
+{
+    if (const MethodRun* run = cls->FindRun(name)) {
+        found.What = Resolution::Method;
+        found.Owner = cls;
+        found.Run = run;
+        return true;
+    }
+    if (depth >= MaxSearchDepth)
+        return false;
+    for (auto& [type, adapter] : cls->m_Adapters) {
+        GenericClass* target = adapter->GetTargetGenericClass(host);
+        if (!target)
+            continue;
+        found.Path.push_back(adapter);
+        if (FindMethodPath(host, target, name, depth + 1, found))
+            return true;
+        found.Path.pop_back();
+    }
+    return false;
+}
+
+// A member, then a constant, of the class, then the same through its adapters.
+bool FindMemberPath(CHost& host, GenericClass* cls, const char* name, int depth, Resolution& found)
+{
+    found.FoundMember = cls->FindOwnMember(name);
+    found.FoundConstant = found.FoundMember ? nullptr : cls->FindOwnConstant(name);
+    if (found.FoundMember || found.FoundConstant) {
+        found.What = found.FoundMember ? Resolution::Member : Resolution::Constant;
+        found.Owner = cls;
+        return true;
+    }
+    if (depth >= MaxSearchDepth)
+        return false;
+    for (auto& [type, adapter] : cls->m_Adapters) {
+        GenericClass* target = adapter->GetTargetGenericClass(host);
+        if (!target)
+            continue;
+        found.Path.push_back(adapter);
+        if (FindMemberPath(host, target, name, depth + 1, found))
+            return true;
+        found.Path.pop_back();
+    }
+    return false;
+}
+
+} // namespace
+
+Resolution& GenericClass::Resolve(CHost& host, const char* name)
+{
+    auto it = m_Resolutions.find(name);
+    if (it == m_Resolutions.end()) {
+        it = m_Resolutions.emplace(name, Resolution()).first;
+        it->second.Class = this;
+        it->second.Name = name;
+        Refresh(host, it->second);
+    } else if (it->second.Stamp != host.GetStamp()) {
+        Refresh(host, it->second);
+    }
+    return it->second;
+}
+
+void GenericClass::Refresh(CHost& host, Resolution& resolution)
+{
+    const char* name = resolution.Name.c_str();
+    resolution.Stamp = host.GetStamp();
+    resolution.What = Resolution::Nothing;
+    resolution.Owner = nullptr;
+    resolution.Run = nullptr;
+    resolution.FoundMember = nullptr;
+    resolution.FoundConstant = nullptr;
+    resolution.Path.clear();
+    // Every method of every base comes before any member.
+    if (FindMethodPath(host, this, name, 0, resolution))
+        return;
+    resolution.Path.clear();
+    if (!FindMemberPath(host, this, name, 0, resolution))
+        resolution.Path.clear();
+}
+
 GenericMember* GenericClass::FindOwnMember(const char* name) const
 {
     for (auto& [member_name, member] : m_Members)

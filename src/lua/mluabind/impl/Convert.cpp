@@ -23,10 +23,6 @@ LuaCustomVariable* CreateVariable(CHost& host, lua_State* L, GenericClass* cls, 
     lua_rawgeti(L, LUA_REGISTRYINDEX, cls->m_MetatableRef);
     if (!lua_setmetatable(L, -2))
         host.Report("can't set metatable!\n");
-    // Every variable starts with the shared empty environment; the first method lookup
-    // gives it a table of its own for the method closures.
-    lua_rawgeti(L, LUA_REGISTRYINDEX, host.GetFreshEnvironmentRef());
-    lua_setfenv(L, -2);
     return variable;
 }
 

@@ -175,6 +175,36 @@ struct MethodRun {
     size_t Count = 0;
 };
 
+// What a name read from an object of a class stands for: the first method found in the
+// class or through its adapters, else a member or constant. Made at the first read of the
+// name and kept at a stable address, since method closures hold it; made again in place
+// when the host's registry has changed since.
+struct Resolution {
+    enum Kind : uint8_t { Nothing, Method, Member, Constant };
+
+    GenericClass* Class = nullptr; // the class of the objects it serves
+    std::string Name;
+    uint64_t Stamp = 0;
+    Kind What = Nothing;
+    GenericClass* Owner = nullptr; // the class that declares what was found
+    const MethodRun* Run = nullptr;
+    GenericMember* FoundMember = nullptr;
+    GenericConstant* FoundConstant = nullptr;
+    // Adapters from Class to Owner, in the order they convert; empty when Owner is Class.
+    std::vector<ClassConvertAdapter*> Path;
+
+    // The object pointer of `Class` converted to `Owner`; null stays null.
+    void* Convert(void* object) const
+    {
+        for (ClassConvertAdapter* adapter : Path) {
+            if (!object)
+                break;
+            object = adapter->Upcast(object);
+        }
+        return object;
+    }
+};
+
 class GenericClass : public DeclaratedClass {
 public:
     using MethodEntry = std::pair<const char*, GenericMethod*>;
@@ -195,7 +225,6 @@ public:
     std::string m_NativeName;
     // The instance metatable in the Lua registry, made when the class is published.
     int m_MetatableRef = LUA_NOREF;
-
 
     void AddMethod(GenericMethod* method);
     void AddOperator(int index, GenericMethod* method);
@@ -219,9 +248,14 @@ public:
     // The first constructor that can build this class implicitly from the value at
     // `index`, or null.
     ConstructorDescription* FindImplicitConstructor(CHost& host, lua_State* L, int index) const;
+    // What `name` stands for on objects of this class, current with the host's registry.
+    Resolution& Resolve(CHost& host, const char* name);
+    // Brings a resolution of this class up to date with the host's registry.
+    void Refresh(CHost& host, Resolution& resolution);
 
 private:
     std::map<std::string, MethodRun, std::less<>> m_Runs;
+    std::map<std::string, Resolution, std::less<>> m_Resolutions;
     size_t m_RunsBuiltFor = 0;
 };
 

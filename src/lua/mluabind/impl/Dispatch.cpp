@@ -166,75 +166,6 @@ int MethodCallDispatcher(CHost& host, lua_State* L, LuaCustomVariable& view, Lua
     return 0;
 }
 
-// The overloads of `name` in the class itself, else the first found through its adapters
-// in map order.
-const MethodRun* FindMethod(CHost& host, GenericClass* cls, const char* name, int depth)
-{
-    if (const MethodRun* run = cls->FindRun(name))
-        return run;
-    if (depth >= MaxSearchDepth)
-        return nullptr;
-    for (auto& [type, adapter] : cls->m_Adapters) {
-        GenericClass* target = adapter->GetTargetGenericClass(host);
-        if (!target)
-            continue;
-        if (const MethodRun* run = FindMethod(host, target, name, depth + 1))
-            return run;
-    }
-    return nullptr;
-}
-
-// Converts an object pointer of `from` to the class `to` that was found through adapters.
-void* UpcastTo(CHost& host, GenericClass* from, GenericClass* to, void* object, int depth)
-{
-    if (from == to || !object)
-        return object;
-    if (from->CanUpcast(*to->m_Type))
-        return from->Upcast(host, *to->m_Type, object);
-    if (depth >= MaxSearchDepth)
-        return nullptr;
-    // No stored path (a base published after its derived class): walk the adapters.
-    for (auto& [type, adapter] : from->m_Adapters) {
-        GenericClass* target = adapter->GetTargetGenericClass(host);
-        if (!target)
-            continue;
-        if (void* result = UpcastTo(host, target, to, adapter->Upcast(object), depth + 1))
-            return result;
-    }
-    return nullptr;
-}
-
-// Members and constants of the class, then of the classes behind its adapters.
-bool FindMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& view, const char* name, int& results,
-                int depth)
-{
-    if (GenericMember* member = cls->FindOwnMember(name)) {
-        if (!view.Object) {
-            ReportNull(host, "MetaOperatorIndex", cls);
-            results = 0;
-        } else {
-            results = member->Get(host, L, view);
-        }
-        return true;
-    }
-    if (GenericConstant* constant = cls->FindOwnConstant(name)) {
-        constant->Push(host, L);
-        results = 1;
-        return true;
-    }
-    if (depth >= MaxSearchDepth)
-        return false;
-    for (auto& [type, adapter] : cls->m_Adapters) {
-        GenericClass* target = adapter->GetTargetGenericClass(host);
-        if (!target)
-            continue;
-        LuaCustomVariable base{view.Object ? adapter->Upcast(view.Object) : nullptr, target, 0, view.IsConst, kVariableTag};
-        if (FindMember(host, L, target, base, name, results, depth + 1))
-            return true;
-    }
-    return false;
-}
-
 bool SetMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& view, const char* name, int depth)
 {
     if (GenericMember* member = cls->FindOwnMember(name)) {
@@ -257,45 +188,112 @@ bool SetMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& 
     return false;
 }
 
+// Key of the object in the method cache of an object (see CacheMethod); no script can
+// make a light userdata of this address.
+char g_CachedObjectKey;
+
+// The resolution of the name at index 2 for the variable: from the class's table of names
+// (upvalue 2 of __index) when it is current, else made and entered there.
+Resolution& ResolveName(CHost& host, lua_State* L, LuaCustomVariable& self)
+{
+    int names = lua_upvalueindex(2);
+    lua_pushvalue(L, 2);
+    lua_rawget(L, names);
+    auto* known = static_cast<Resolution*>(lua_touserdata(L, -1));
+    lua_pop(L, 1);
+    if (known && known->Class == self.Class && known->Stamp == host.GetStamp())
+        return *known;
+    Resolution& resolution = self.Class->Resolve(host, lua_tostring(L, 2));
+    if (lua_istable(L, names)) {
+        lua_pushvalue(L, 2);
+        lua_pushlightuserdata(L, &resolution);
+        lua_rawset(L, names);
+    }
+    return resolution;
+}
+
+// Stores the method closure on top under the name at index 2 in the object's own method
+// cache, so that the next read of the name is a plain table read in Lua. The cache is the
+// __index of a metatable of the object's own, a copy of its class's; misses in the cache
+// fall through to the class's __index, which finds the object under g_CachedObjectKey.
+void CacheMethod(lua_State* L)
+{
+    int closure = lua_gettop(L);
+    if (!lua_getmetatable(L, 1))
+        return;
+    int mt = closure + 1;
+    lua_getfield(L, mt, "__index");
+    if (!lua_istable(L, -1)) {
+        lua_pop(L, 1);
+        lua_createtable(L, 0, 4); // the cache
+        int cache = lua_gettop(L);
+        lua_pushlightuserdata(L, &g_CachedObjectKey);
+        lua_pushvalue(L, 1);
+        lua_rawset(L, cache);
+        lua_pushvalue(L, mt);
+        lua_setmetatable(L, cache);
+        lua_createtable(L, 0, 8); // the object's metatable
+        int own = lua_gettop(L);
+        lua_pushnil(L);
+        while (lua_next(L, mt)) {
+            lua_pushvalue(L, -2);
+            lua_insert(L, -2);
+            lua_rawset(L, own);
+        }
+        lua_pushvalue(L, cache);
+        lua_setfield(L, own, "__index");
+        lua_setmetatable(L, 1);
+    }
+    lua_pushvalue(L, 2);
+    lua_pushvalue(L, closure);
+    lua_rawset(L, -3);
+    lua_settop(L, closure);
+}
+
 int IndexBody(CHost& host, lua_State* L)
 {
     if (lua_type(L, 2) != LUA_TSTRING) {
         host.Report("MetaOperatorIndex: panic - currently supports only string indexes.\n");
         return 0;
     }
+    lua_settop(L, 2);
+    if (lua_type(L, 1) == LUA_TTABLE) {
+        // A miss in an object's method cache: the object is in the cache.
+        lua_pushlightuserdata(L, &g_CachedObjectKey);
+        lua_rawget(L, 1);
+        lua_replace(L, 1);
+    }
     LuaCustomVariable* self = ToVariable(L, 1);
     if (!self) {
         ReportForeign(host, "MetaOperatorIndex");
         return 0;
     }
-    lua_settop(L, 2);
-    const char* name = lua_tostring(L, 2);
-    if (const MethodRun* run = FindMethod(host, self->Class, name, 0)) {
-        // The closure holds the object itself, so it can outlive every other reference;
-        // it waits in the object's own environment table for the next lookup.
+    Resolution& found = ResolveName(host, L, *self);
+    switch (found.What) {
+    case Resolution::Method:
+        // The closure holds the object itself, so it can outlive every other reference.
         lua_pushlightuserdata(L, &host);
         lua_pushvalue(L, 1);
-        lua_pushlightuserdata(L, const_cast<MethodRun*>(run));
-        lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3); // 3
-        lua_getfenv(L, 1);                                     // 4
-        lua_rawgeti(L, LUA_REGISTRYINDEX, host.GetFreshEnvironmentRef());
-        if (lua_rawequal(L, 4, 5)) {
-            lua_newtable(L);
-            lua_replace(L, 4);
-            lua_pushvalue(L, 4);
-            lua_setfenv(L, 1);
-        }
-        lua_settop(L, 4);
-        lua_pushvalue(L, 2);
-        lua_pushvalue(L, 3);
-        lua_rawset(L, 4);
-        lua_settop(L, 3);
+        lua_pushlightuserdata(L, &found);
+        lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3);
+        CacheMethod(L);
         return 1;
+    case Resolution::Member: {
+        void* object = found.Convert(self->Object);
+        if (!object) {
+            ReportNull(host, "MetaOperatorIndex", found.Owner);
+            return 0;
+        }
+        LuaCustomVariable view{object, found.Owner, 0, self->IsConst, kVariableTag};
+        return found.FoundMember->Get(host, L, view);
     }
-    int results = 0;
-    if (FindMember(host, L, self->Class, *self, name, results, 0))
-        return results;
-    host.Report("MetaOperatorIndex: error - unknown symbol %s.\n", name);
+    case Resolution::Constant:
+        found.FoundConstant->Push(host, L);
+        return 1;
+    case Resolution::Nothing:
+        break;
+    }
+    host.Report("MetaOperatorIndex: error - unknown symbol %s.\n", lua_tostring(L, 2));
     return 0;
 }
 
@@ -332,18 +330,20 @@ int ReadOnlyBody(CHost& host, lua_State* L)
 int MethodCallBody(CHost& host, lua_State* L)
 {
     auto* self = static_cast<LuaCustomVariable*>(lua_touserdata(L, lua_upvalueindex(2)));
-    auto* run = static_cast<const MethodRun*>(lua_touserdata(L, lua_upvalueindex(3)));
-    if (!run || run->Count == 0) {
-        host.Report("GenericClass::LuaMethodCallProxieFunction: panic - can't find GenericMethod %s!\n", "?");
+    auto* found = static_cast<Resolution*>(lua_touserdata(L, lua_upvalueindex(3)));
+    if (found->Stamp != host.GetStamp())
+        found->Class->Refresh(host, *found);
+    if (found->What != Resolution::Method || found->Run->Count == 0) {
+        host.Report("GenericClass::LuaMethodCallProxieFunction: panic - can't find GenericMethod %s!\n", found->Name.c_str());
         return 0;
     }
-    GenericClass* owner = run->Owner;
-    void* object = self->Class == owner ? self->Object : UpcastTo(host, self->Class, owner, self->Object, 0);
+    void* object = found->Convert(self->Object);
     if (!object) {
-        ReportNull(host, "GenericClass::LuaMethodCallProxieFunction", owner);
+        ReportNull(host, "GenericClass::LuaMethodCallProxieFunction", found->Owner);
         return 0;
     }
-    LuaCustomVariable view{object, owner, 0, self->IsConst, kVariableTag};
+    const MethodRun* run = found->Run;
+    LuaCustomVariable view{object, found->Owner, 0, self->IsConst, kVariableTag};
     return MethodCallDispatcher(host, L, view, self, run->Begin, run->Count, run->Begin->first);
 }
 
@@ -557,19 +557,7 @@ int GetRttiTypeBody(CHost&, lua_State* L) { return TypeBody(L, false, true); }
 
 } // namespace
 
-int MetaOperatorIndex(lua_State* L)
-{
-    // Fast path without a call frame: a method closure made before for this object.
-    if (lua_type(L, 1) == LUA_TUSERDATA && lua_type(L, 2) == LUA_TSTRING) {
-        lua_getfenv(L, 1);
-        lua_pushvalue(L, 2);
-        lua_rawget(L, -2);
-        if (!lua_isnil(L, -1))
-            return 1;
-        lua_settop(L, 2);
-    }
-    return Entry<&IndexBody>(L);
-}
+int MetaOperatorIndex(lua_State* L) { return Entry<&IndexBody>(L); }
 int MetaOperatorNewIndex(lua_State* L) { return Entry<&NewIndexBody>(L); }
 int MetaOperatorReadOnly(lua_State* L) { return Entry<&ReadOnlyBody>(L); }
 int LuaMethodCallProxieFunction(lua_State* L) { return Entry<&MethodCallBody>(L); }
