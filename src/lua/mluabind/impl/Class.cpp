@@ -61,6 +61,9 @@ const MethodRun* GenericClass::FindRun(const char* name)
             run.Owner = this;
             run.Begin = &m_Methods[k];
             run.Count = end - k;
+            run.Typed = std::all_of(run.Begin, run.Begin + run.Count,
+                                    [](const MethodEntry& entry) { return entry.second->Typed && !entry.second->SelfFirst; });
+            run.ChosenFor = 0;
             k = end;
         }
         m_RunsBuiltFor = m_Methods.size();
@@ -304,6 +307,10 @@ GenericClass* ClassUpCastConvertAdapter::GetTargetGenericClass(CHost& host)
     }
     return m_TargetClass;
 }
+
+int GenericMethod::TryCall(CHost&, lua_State*, LuaCustomVariable&) { return NotTaken; }
+
+int GenericFunction::TryCall(CHost&, lua_State*) { return NotTaken; }
 
 void GenericMethodPolicy::BeforeCall(CHost&, lua_State*, LuaCustomVariable*) {}
 

@@ -15,6 +15,11 @@ namespace mluabind::i {
 // A score: lower is better; NoMatch means the candidate can't be used.
 constexpr int NoMatch = 1000000;
 
+// Results of TryCall besides a result count: the values don't fit; or the signature can't
+// be scored and converted in one step, so the caller goes the long way.
+constexpr int TakeFailed = -1;
+constexpr int NotTaken = -2;
+
 // Score of a parameter list of a generated signature from stack index `start` on.
 using MatchFn = int (*)(CHost& host, lua_State* L, int start, int count, bool allow_implicit);
 // The parameter type names of a signature joined by ", ".
@@ -70,9 +75,13 @@ public:
     // Extracts the arguments from index 1 on, runs the native code on `self` and pushes the
     // result; gives the number of results.
     virtual int Call(CHost& host, lua_State* L, LuaCustomVariable& self) = 0;
+    // Scores the values from index 1 on and, when they fit, converts them and calls in the
+    // same pass (no policy, no operator); gives TakeFailed or NotTaken otherwise.
+    virtual int TryCall(CHost& host, lua_State* L, LuaCustomVariable& self);
 
     bool IsConst = false;
     bool SelfFirst = false; // operators: the object is the first value on the stack
+    bool Typed = false;     // its score depends on the Lua types of the values alone
     std::string Name;
     MatchFn MatchFunction = nullptr;
     SignatureFn SignatureFunction = nullptr;
@@ -82,6 +91,8 @@ public:
 class GenericFunction : public DeclaratedClass {
 public:
     virtual int Call(CHost& host, lua_State* L) = 0;
+    // As GenericMethod::TryCall.
+    virtual int TryCall(CHost& host, lua_State* L);
 
     MatchFn MatchFunction = nullptr;
     SignatureFn SignatureFunction = nullptr;
@@ -173,6 +184,11 @@ struct MethodRun {
     GenericClass* Owner = nullptr;
     const std::pair<const char*, GenericMethod*>* Begin = nullptr;
     size_t Count = 0;
+    // Every overload is Typed: the Lua types of the values (and the object's const) decide
+    // the choice, which is kept for the last such key.
+    bool Typed = false;
+    mutable uint64_t ChosenFor = 0;
+    mutable size_t Chosen = 0;
 };
 
 // What a name read from an object of a class stands for: the first method found in the

@@ -4,6 +4,7 @@
 
 #include "lua/mluabind/Binding.h"
 
+#include <algorithm>
 #include <exception>
 #include <string>
 
@@ -125,30 +126,63 @@ int InvokeMethod(CHost& host, lua_State* L, GenericMethod* method, LuaCustomVari
     return results;
 }
 
+// The Lua types of the values on the stack and the const of the object, as a key for the
+// choice among typed overloads; 0 when there are too many values for a key.
+uint64_t TypeKey(lua_State* L, bool is_const)
+{
+    int top = lua_gettop(L);
+    if (top > 14)
+        return 0;
+    uint64_t key = uint64_t{1} << 63 | uint64_t{is_const} << 62 | uint64_t(top) << 56;
+    for (int index = 1; index <= top; ++index)
+        key |= uint64_t(lua_type(L, index) + 1) << (4 * (index - 1));
+    return key;
+}
+
 // Picks the overload with the lowest score among a run of methods or operators; runs it
-// when it is the only one, else reports the candidates and the arguments.
+// when it is the only one, else reports the candidates and the arguments. With a typed
+// run of a class, the choice is kept for the next call with the same key.
 template <class Entry>
 int MethodCallDispatcher(CHost& host, lua_State* L, LuaCustomVariable& view, LuaCustomVariable* self,
-                         const Entry* run, size_t count, const char* name)
+                         const Entry* run, size_t count, const char* name, const MethodRun* typed = nullptr)
 {
     GenericMethod* candidates[MaxMethodCandidates];
     int found = 0;
     int best = NoMatch;
+    uint64_t key = 0;
     if (count == 1) {
-        // The common case needs no candidate list.
+        // The common case: one overload, scored and converted in one pass where it can be.
         GenericMethod* method = run[0].second;
-        best = MatchMethod(host, L, method, view, self);
-        if (best < NoMatch)
-            return InvokeMethod(host, L, method, view, self);
+        int results = NotTaken;
+        if (!method->Policy && !method->SelfFirst && !(view.IsConst && !method->IsConst))
+            results = method->TryCall(host, L, view);
+        if (results >= 0)
+            return results;
+        if (results == NotTaken) {
+            best = MatchMethod(host, L, method, view, self);
+            if (best < NoMatch)
+                return InvokeMethod(host, L, method, view, self);
+        }
         candidates[found++] = method;
         count = 0;
+    } else if (typed && typed->Typed) {
+        key = TypeKey(L, view.IsConst != 0);
+        if (key && key == typed->ChosenFor)
+            return InvokeMethod(host, L, run[typed->Chosen].second, view, self);
     }
     for (size_t k = 0; k < count; ++k) {
         GenericMethod* method = run[k].second;
         KeepBest(method, MatchMethod(host, L, method, view, self), candidates, MaxMethodCandidates, found, best);
     }
-    if (best != NoMatch && found == 1)
+    if (best != NoMatch && found == 1) {
+        if (key) {
+            typed->Chosen = static_cast<size_t>(std::find_if(run, run + count, [&](const Entry& entry) {
+                                                    return entry.second == candidates[0];
+                                                }) - run);
+            typed->ChosenFor = key;
+        }
         return InvokeMethod(host, L, candidates[0], view, self);
+    }
 
     std::string lines;
     for (int k = 0; k < found; ++k) {
@@ -198,9 +232,8 @@ Resolution& ResolveName(CHost& host, lua_State* L, LuaCustomVariable& self)
 {
     int names = lua_upvalueindex(2);
     lua_pushvalue(L, 2);
-    lua_rawget(L, names);
+    lua_rawget(L, names); // stays on the stack: results go on top of it
     auto* known = static_cast<Resolution*>(lua_touserdata(L, -1));
-    lua_pop(L, 1);
     if (known && known->Class == self.Class && known->Stamp == host.GetStamp())
         return *known;
     Resolution& resolution = self.Class->Resolve(host, lua_tostring(L, 2));
@@ -256,14 +289,15 @@ int IndexBody(CHost& host, lua_State* L)
         host.Report("MetaOperatorIndex: panic - currently supports only string indexes.\n");
         return 0;
     }
-    lua_settop(L, 2);
-    if (lua_type(L, 1) == LUA_TTABLE) {
+    int type = lua_type(L, 1);
+    if (type == LUA_TTABLE) {
         // A miss in an object's method cache: the object is in the cache.
         lua_pushlightuserdata(L, &g_CachedObjectKey);
         lua_rawget(L, 1);
         lua_replace(L, 1);
+        type = lua_type(L, 1);
     }
-    LuaCustomVariable* self = ToVariable(L, 1);
+    LuaCustomVariable* self = type == LUA_TUSERDATA ? UserdataVariable(L, 1) : nullptr;
     if (!self) {
         ReportForeign(host, "MetaOperatorIndex");
         return 0;
@@ -344,7 +378,7 @@ int MethodCallBody(CHost& host, lua_State* L)
     }
     const MethodRun* run = found->Run;
     LuaCustomVariable view{object, found->Owner, 0, self->IsConst, kVariableTag};
-    return MethodCallDispatcher(host, L, view, self, run->Begin, run->Count, run->Begin->first);
+    return MethodCallDispatcher(host, L, view, self, run->Begin, run->Count, run->Begin->first, run);
 }
 
 bool HasOperator(const LuaCustomVariable* variable, int index)
@@ -423,6 +457,11 @@ int FunctionBody(CHost& host, lua_State* L)
     if (!overloads || overloads->empty()) {
         host.Report("LuaGlobalFunctionDispatcher: panic - can't find GenericFunction %s!\n", name ? name : "");
         return 0;
+    }
+    if (overloads->size() == 1 && !overloads->front()->Policy) {
+        int results = overloads->front()->TryCall(host, L);
+        if (results >= 0)
+            return results;
     }
     GenericFunction* candidates[MaxFunctionCandidates];
     int found = 0;
