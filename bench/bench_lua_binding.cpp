@@ -111,7 +111,11 @@ public:
                                .Method("AddAny", static_cast<double (Counter::*)(const char*)>(&Counter::Add))
                                .Method("AddAny", static_cast<double (Counter::*)(bool)>(&Counter::Add))
                                .Method("AddAny", static_cast<double (Counter::*)(double)>(&Counter::Add))
-                               .Property("Total", &Counter::GetTotal)));
+                               .Property("Total", &Counter::GetTotal))
+                 .AddFunction(Function("Shared", [] {
+                     static Counter shared;
+                     return &shared;
+                 })));
         EndBinding();
         RegisterRaw(L);
         Run("bound = bench.Counter()");
@@ -177,6 +181,9 @@ void BM_RawCApiConstructor(benchmark::State& state) { RunLoop(state, "local c = 
 void BM_BoundConstructor(benchmark::State& state) { RunLoop(state, "local c = bench.Counter()"); }
 void BM_RawCApiPropertyGet(benchmark::State& state) { RunLoop(state, "local t = rawprops.Total"); }
 void BM_BoundPropertyGet(benchmark::State& state) { RunLoop(state, "local t = bound.Total"); }
+// A new variable for every call, as `Instance().Method()` makes one: the first read of a
+// method on an object.
+void BM_BoundFreshObjectCall(benchmark::State& state) { RunLoop(state, "bench.Shared().Add(1)"); }
 
 BENCHMARK(BM_RawCApiMemberCall);
 BENCHMARK(BM_BoundMemberCall);
@@ -185,6 +192,7 @@ BENCHMARK(BM_RawCApiConstructor);
 BENCHMARK(BM_BoundConstructor);
 BENCHMARK(BM_RawCApiPropertyGet);
 BENCHMARK(BM_BoundPropertyGet);
+BENCHMARK(BM_BoundFreshObjectCall);
 
 } // namespace
 

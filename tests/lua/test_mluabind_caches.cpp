@@ -74,10 +74,10 @@ class Caches : public ::testing::Test {
 protected:
     void SetUp() override { host.Declare(Lamps); }
 
-    // Runs a chunk after `lamp` has read a method, so that it reads through its cache.
+    // Runs a chunk after `lamp` has read methods twice, so that Lua reads through its cache.
     std::string RunCached(const std::string& code)
     {
-        return host.Run("lamp = Lamp() lamp.GetLevel() " + code);
+        return host.Run("lamp = Lamp() lamp.GetLevel() lamp.Power() " + code);
     }
 
     LuaTestHost host;
@@ -86,9 +86,12 @@ protected:
 TEST_F(Caches, AnObjectWithCachedMethodsReadsEverythingElseAsBefore)
 {
     EXPECT_EQ(RunCached("lamp.Level = 3 return lamp.Level + lamp.Doubled + lamp.Bright + lamp.GetLevel()"), "19");
+    // Lua reads the cache through a metatable of the object's own; scripts see the class's face.
+    EXPECT_EQ(RunCached("return tostring(debug.getmetatable(lamp) ~= debug.getmetatable(Lamp()))"), "true");
     EXPECT_EQ(RunCached("return tostring(getmetatable(lamp) == getmetatable(Lamp()))"), "true");
     EXPECT_EQ(RunCached("local other = Lamp() return tostring(lamp == other) .. tostring(other == lamp)"), "truetrue");
     EXPECT_EQ(RunCached("return level(lamp)"), "1");
+    EXPECT_EQ(RunCached("local take = lamp.Take return tostring(take == lamp.Take and lamp.Power == lamp.Power)"), "true");
     EXPECT_TRUE(host.Reports.empty()) << host.LastReport();
 
     struct Case {

@@ -222,8 +222,8 @@ bool SetMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& 
     return false;
 }
 
-// Key of the object in the method cache of an object (see CacheMethod); no script can
-// make a light userdata of this address.
+// Key of the object in its own method cache (see PushMethodCache); no script can make a
+// light userdata of this address.
 char g_CachedObjectKey;
 
 // The resolution of the name at index 2 for the variable: from the class's table of names
@@ -245,42 +245,79 @@ Resolution& ResolveName(CHost& host, lua_State* L, LuaCustomVariable& self)
     return resolution;
 }
 
-// Stores the method closure on top under the name at index 2 in the object's own method
-// cache, so that the next read of the name is a plain table read in Lua. The cache is the
-// __index of a metatable of the object's own, a copy of its class's; misses in the cache
-// fall through to the class's __index, which finds the object under g_CachedObjectKey.
-void CacheMethod(lua_State* L)
+// Gives the object at index 1 a metatable of its own, a copy of its class's whose __index
+// is the cache at `cache`. Misses in the cache fall through to the class's __index, which
+// finds the object in the cache.
+void ReadThroughCache(lua_State* L, int cache)
 {
-    int closure = lua_gettop(L);
     if (!lua_getmetatable(L, 1))
         return;
-    int mt = closure + 1;
-    lua_getfield(L, mt, "__index");
-    if (!lua_istable(L, -1)) {
-        lua_pop(L, 1);
-        lua_createtable(L, 0, 4); // the cache
-        int cache = lua_gettop(L);
-        lua_pushlightuserdata(L, &g_CachedObjectKey);
-        lua_pushvalue(L, 1);
-        lua_rawset(L, cache);
-        lua_pushvalue(L, mt);
-        lua_setmetatable(L, cache);
-        lua_createtable(L, 0, 8); // the object's metatable
-        int own = lua_gettop(L);
-        lua_pushnil(L);
-        while (lua_next(L, mt)) {
-            lua_pushvalue(L, -2);
-            lua_insert(L, -2);
-            lua_rawset(L, own);
-        }
-        lua_pushvalue(L, cache);
-        lua_setfield(L, own, "__index");
-        lua_setmetatable(L, 1);
+    int mt = lua_gettop(L);
+    lua_pushvalue(L, mt);
+    lua_setmetatable(L, cache);
+    lua_createtable(L, 0, 8);
+    int own = lua_gettop(L);
+    lua_pushnil(L);
+    while (lua_next(L, mt)) {
+        lua_pushvalue(L, -2);
+        lua_insert(L, -2);
+        lua_rawset(L, own);
     }
-    lua_pushvalue(L, 2);
-    lua_pushvalue(L, closure);
+    lua_pushvalue(L, cache);
+    lua_setfield(L, own, "__index");
+    lua_setmetatable(L, 1);
+    lua_settop(L, cache);
+}
+
+// Pushes the method cache of the object at index 1: a table of method closures by name, in
+// the object's environment. It is made at the first method read; from the second on, Lua
+// reads it without a native call (ReadThroughCache), so objects read once, as the result of
+// `Instance()`, don't pay for a metatable. `cache` is the cache when __index was entered
+// for a miss in it, else 0.
+void PushMethodCache(lua_State* L, int cache)
+{
+    if (cache) {
+        lua_pushvalue(L, cache);
+        return;
+    }
+    lua_getfenv(L, 1);
+    int env = lua_gettop(L);
+    lua_pushlightuserdata(L, &g_CachedObjectKey);
+    lua_rawget(L, env);
+    bool made = lua_rawequal(L, -1, 1);
+    lua_pop(L, 1);
+    if (made) {
+        ReadThroughCache(L, env);
+        return;
+    }
+    lua_pop(L, 1);
+    lua_createtable(L, 0, 2);
+    lua_pushlightuserdata(L, &g_CachedObjectKey);
+    lua_pushvalue(L, 1);
     lua_rawset(L, -3);
-    lua_settop(L, closure);
+    lua_pushvalue(L, -1);
+    lua_setfenv(L, 1);
+}
+
+// Pushes the closure of a method for the object at index 1, the one made before for the
+// name at index 2 if there is one. The closure holds the object itself, so it can outlive
+// every other reference.
+void PushMethod(CHost& host, lua_State* L, Resolution& found, int cache)
+{
+    PushMethodCache(L, cache);
+    int table = lua_gettop(L);
+    lua_pushvalue(L, 2);
+    lua_rawget(L, table);
+    if (lua_iscfunction(L, -1))
+        return;
+    lua_pop(L, 1);
+    lua_pushlightuserdata(L, &host);
+    lua_pushvalue(L, 1);
+    lua_pushlightuserdata(L, &found);
+    lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3);
+    lua_pushvalue(L, 2);
+    lua_pushvalue(L, -2);
+    lua_rawset(L, table);
 }
 
 int IndexBody(CHost& host, lua_State* L)
@@ -290,8 +327,11 @@ int IndexBody(CHost& host, lua_State* L)
         return 0;
     }
     int type = lua_type(L, 1);
+    int cache = 0;
     if (type == LUA_TTABLE) {
         // A miss in an object's method cache: the object is in the cache.
+        lua_pushvalue(L, 1);
+        cache = lua_gettop(L);
         lua_pushlightuserdata(L, &g_CachedObjectKey);
         lua_rawget(L, 1);
         lua_replace(L, 1);
@@ -305,12 +345,7 @@ int IndexBody(CHost& host, lua_State* L)
     Resolution& found = ResolveName(host, L, *self);
     switch (found.What) {
     case Resolution::Method:
-        // The closure holds the object itself, so it can outlive every other reference.
-        lua_pushlightuserdata(L, &host);
-        lua_pushvalue(L, 1);
-        lua_pushlightuserdata(L, &found);
-        lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3);
-        CacheMethod(L);
+        PushMethod(host, L, found, cache);
         return 1;
     case Resolution::Member: {
         void* object = found.Convert(self->Object);
