@@ -102,6 +102,7 @@ TEST_F(Caches, AnObjectWithCachedMethodsReadsEverythingElseAsBefore)
         {"return lamp.Nothing", "MetaOperatorIndex: error - unknown symbol Nothing.\n"},
         {"lamp.Nothing = 1", "MetaOperatorIndex: error - unknown symbol Nothing.\n"},
         {"return lamp[1]", "MetaOperatorIndex: panic - currently supports only string indexes.\n"},
+        {"getmetatable(lamp).__index(lamp, 'Take') return lamp.Nothing", "MetaOperatorIndex: error - unknown symbol Nothing.\n"},
         {"getmetatable(lamp).__gc(lamp) return lamp.Level",
          "MetaOperatorIndex: error - the object of Lamp is null or was collected.\n"},
         {"getmetatable(lamp).__gc(lamp) return lamp.GetLevel()",

@@ -126,18 +126,21 @@ bool FindMemberPath(CHost& host, GenericClass* cls, const char* name, int depth,
 
 } // namespace
 
-Resolution& GenericClass::Resolve(CHost& host, const char* name)
+Resolution* GenericClass::Resolve(CHost& host, const char* name)
 {
     auto it = m_Resolutions.find(name);
-    if (it == m_Resolutions.end()) {
-        it = m_Resolutions.emplace(name, Resolution()).first;
-        it->second.Class = this;
-        it->second.Name = name;
-        Refresh(host, it->second);
-    } else if (it->second.Stamp != host.GetStamp()) {
-        Refresh(host, it->second);
+    if (it != m_Resolutions.end()) {
+        if (it->second.Stamp != host.GetStamp())
+            Refresh(host, it->second);
+        return &it->second;
     }
-    return it->second;
+    Resolution resolution;
+    resolution.Class = this;
+    resolution.Name = name;
+    Refresh(host, resolution);
+    if (resolution.What == Resolution::Nothing)
+        return nullptr; // unknown names leave nothing behind
+    return &m_Resolutions.emplace(name, std::move(resolution)).first->second;
 }
 
 void GenericClass::Refresh(CHost& host, Resolution& resolution)

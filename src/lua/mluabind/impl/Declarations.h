@@ -264,8 +264,9 @@ public:
     // The first constructor that can build this class implicitly from the value at
     // `index`, or null.
     ConstructorDescription* FindImplicitConstructor(CHost& host, lua_State* L, int index) const;
-    // What `name` stands for on objects of this class, current with the host's registry.
-    Resolution& Resolve(CHost& host, const char* name);
+    // What `name` stands for on objects of this class, current with the host's registry;
+    // null for a name that never stood for anything.
+    Resolution* Resolve(CHost& host, const char* name);
     // Brings a resolution of this class up to date with the host's registry.
     void Refresh(CHost& host, Resolution& resolution);
 

@@ -227,19 +227,20 @@ bool SetMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& 
 char g_CachedObjectKey;
 
 // The resolution of the name at index 2 for the variable: from the class's table of names
-// (upvalue 2 of __index) when it is current, else made and entered there.
-Resolution& ResolveName(CHost& host, lua_State* L, LuaCustomVariable& self)
+// (upvalue 2 of __index) when it is current, else made and entered there; null for an
+// unknown name.
+Resolution* ResolveName(CHost& host, lua_State* L, LuaCustomVariable& self)
 {
     int names = lua_upvalueindex(2);
     lua_pushvalue(L, 2);
     lua_rawget(L, names); // stays on the stack: results go on top of it
     auto* known = static_cast<Resolution*>(lua_touserdata(L, -1));
     if (known && known->Class == self.Class && known->Stamp == host.GetStamp())
-        return *known;
-    Resolution& resolution = self.Class->Resolve(host, lua_tostring(L, 2));
-    if (lua_istable(L, names)) {
+        return known;
+    Resolution* resolution = self.Class->Resolve(host, lua_tostring(L, 2));
+    if (resolution && lua_istable(L, names)) {
         lua_pushvalue(L, 2);
-        lua_pushlightuserdata(L, &resolution);
+        lua_pushlightuserdata(L, resolution);
         lua_rawset(L, names);
     }
     return resolution;
@@ -253,6 +254,11 @@ void ReadThroughCache(lua_State* L, int cache)
     if (!lua_getmetatable(L, 1))
         return;
     int mt = lua_gettop(L);
+    lua_getfield(L, mt, "__index");
+    bool own_already = lua_istable(L, -1); // __index called directly by a script
+    lua_settop(L, own_already ? cache : mt);
+    if (own_already)
+        return;
     lua_pushvalue(L, mt);
     lua_setmetatable(L, cache);
     lua_createtable(L, 0, 8);
@@ -342,22 +348,22 @@ int IndexBody(CHost& host, lua_State* L)
         ReportForeign(host, "MetaOperatorIndex");
         return 0;
     }
-    Resolution& found = ResolveName(host, L, *self);
-    switch (found.What) {
+    Resolution* found = ResolveName(host, L, *self);
+    switch (found ? found->What : Resolution::Nothing) {
     case Resolution::Method:
-        PushMethod(host, L, found, cache);
+        PushMethod(host, L, *found, cache);
         return 1;
     case Resolution::Member: {
-        void* object = found.Convert(self->Object);
+        void* object = found->Convert(self->Object);
         if (!object) {
-            ReportNull(host, "MetaOperatorIndex", found.Owner);
+            ReportNull(host, "MetaOperatorIndex", found->Owner);
             return 0;
         }
-        LuaCustomVariable view{object, found.Owner, 0, self->IsConst, kVariableTag};
-        return found.FoundMember->Get(host, L, view);
+        LuaCustomVariable view{object, found->Owner, 0, self->IsConst, kVariableTag};
+        return found->FoundMember->Get(host, L, view);
     }
     case Resolution::Constant:
-        found.FoundConstant->Push(host, L);
+        found->FoundConstant->Push(host, L);
         return 1;
     case Resolution::Nothing:
         break;
