@@ -246,12 +246,12 @@ Resolution* ResolveName(CHost& host, lua_State* L, LuaCustomVariable& self)
     return resolution;
 }
 
-// Gives the object at index 1 a metatable of its own, a copy of its class's whose __index
+// Gives the object at `object` a metatable of its own, a copy of its class's whose __index
 // is the cache at `cache`. Misses in the cache fall through to the class's __index, which
 // finds the object in the cache.
-void ReadThroughCache(lua_State* L, int cache)
+void ReadThroughCache(lua_State* L, int object, int cache)
 {
-    if (!lua_getmetatable(L, 1))
+    if (!lua_getmetatable(L, object))
         return;
     int mt = lua_gettop(L);
     lua_getfield(L, mt, "__index");
@@ -271,46 +271,46 @@ void ReadThroughCache(lua_State* L, int cache)
     }
     lua_pushvalue(L, cache);
     lua_setfield(L, own, "__index");
-    lua_setmetatable(L, 1);
+    lua_setmetatable(L, object);
     lua_settop(L, cache);
 }
 
-// Pushes the method cache of the object at index 1: a table of method closures by name, in
+// Pushes the method cache of the object at `object`: a table of method closures by name, in
 // the object's environment. It is made at the first method read; from the second on, Lua
 // reads it without a native call (ReadThroughCache), so objects read once, as the result of
 // `Instance()`, don't pay for a metatable. `cache` is the cache when __index was entered
 // for a miss in it, else 0.
-void PushMethodCache(lua_State* L, int cache)
+void PushMethodCache(lua_State* L, int object, int cache)
 {
     if (cache) {
         lua_pushvalue(L, cache);
         return;
     }
-    lua_getfenv(L, 1);
+    lua_getfenv(L, object);
     int env = lua_gettop(L);
     lua_pushlightuserdata(L, &g_CachedObjectKey);
     lua_rawget(L, env);
-    bool made = lua_rawequal(L, -1, 1);
+    bool made = lua_rawequal(L, -1, object);
     lua_pop(L, 1);
     if (made) {
-        ReadThroughCache(L, env);
+        ReadThroughCache(L, object, env);
         return;
     }
     lua_pop(L, 1);
     lua_createtable(L, 0, 2);
     lua_pushlightuserdata(L, &g_CachedObjectKey);
-    lua_pushvalue(L, 1);
+    lua_pushvalue(L, object);
     lua_rawset(L, -3);
     lua_pushvalue(L, -1);
-    lua_setfenv(L, 1);
+    lua_setfenv(L, object);
 }
 
-// Pushes the closure of a method for the object at index 1, the one made before for the
+// Pushes the closure of a method for the object at `object`, the one made before for the
 // name at index 2 if there is one. The closure holds the object itself, so it can outlive
 // every other reference.
-void PushMethod(CHost& host, lua_State* L, Resolution& found, int cache)
+void PushMethod(CHost& host, lua_State* L, Resolution& found, int object, int cache)
 {
-    PushMethodCache(L, cache);
+    PushMethodCache(L, object, cache);
     int table = lua_gettop(L);
     lua_pushvalue(L, 2);
     lua_rawget(L, table);
@@ -318,7 +318,7 @@ void PushMethod(CHost& host, lua_State* L, Resolution& found, int cache)
         return;
     lua_pop(L, 1);
     lua_pushlightuserdata(L, &host);
-    lua_pushvalue(L, 1);
+    lua_pushvalue(L, object);
     lua_pushlightuserdata(L, &found);
     lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3);
     lua_pushvalue(L, 2);
@@ -332,18 +332,18 @@ int IndexBody(CHost& host, lua_State* L)
         host.Report("MetaOperatorIndex: panic - currently supports only string indexes.\n");
         return 0;
     }
-    int type = lua_type(L, 1);
+    int object = 1;
     int cache = 0;
+    int type = lua_type(L, 1);
     if (type == LUA_TTABLE) {
         // A miss in an object's method cache: the object is in the cache.
-        lua_pushvalue(L, 1);
-        cache = lua_gettop(L);
+        cache = 1;
         lua_pushlightuserdata(L, &g_CachedObjectKey);
-        lua_rawget(L, 1);
-        lua_replace(L, 1);
-        type = lua_type(L, 1);
+        lua_rawget(L, cache);
+        object = lua_gettop(L);
+        type = lua_type(L, object);
     }
-    LuaCustomVariable* self = type == LUA_TUSERDATA ? UserdataVariable(L, 1) : nullptr;
+    LuaCustomVariable* self = type == LUA_TUSERDATA ? UserdataVariable(L, object) : nullptr;
     if (!self) {
         ReportForeign(host, "MetaOperatorIndex");
         return 0;
@@ -351,7 +351,7 @@ int IndexBody(CHost& host, lua_State* L)
     Resolution* found = ResolveName(host, L, *self);
     switch (found ? found->What : Resolution::Nothing) {
     case Resolution::Method:
-        PushMethod(host, L, *found, cache);
+        PushMethod(host, L, *found, object, cache);
         return 1;
     case Resolution::Member: {
         void* object = found->Convert(self->Object);
