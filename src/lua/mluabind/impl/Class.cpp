@@ -77,7 +77,7 @@ namespace {
 constexpr int MaxSearchDepth = 32;
 
 // The overloads of `name` in the class itself, else the first found through its adapters
-// in map order; `path` gets the adapters on the way.
+// in map order; the path of `found` gets the adapters on the way.
 bool FindMethodPath(CHost& host, GenericClass* cls, const char* name, int depth, Resolution& found)
 {
     if (const MethodRun* run = cls->FindRun(name)) {
@@ -153,12 +153,10 @@ void GenericClass::Refresh(CHost& host, Resolution& resolution)
     resolution.FoundMember = nullptr;
     resolution.FoundConstant = nullptr;
     resolution.Path.clear();
-    // Every method of every base comes before any member.
-    if (FindMethodPath(host, this, name, 0, resolution))
-        return;
-    resolution.Path.clear();
-    if (!FindMemberPath(host, this, name, 0, resolution))
-        resolution.Path.clear();
+    // Every method of every base comes before any member. A failed search leaves the
+    // path empty.
+    if (!FindMethodPath(host, this, name, 0, resolution))
+        FindMemberPath(host, this, name, 0, resolution);
 }
 
 GenericMember* GenericClass::FindOwnMember(const char* name) const

@@ -179,7 +179,7 @@ struct NameLess {
 
 class GenericClass;
 
-// The overloads of one name in one class, at a stable address for method closures.
+// The overloads of one name in one class, at a stable address for resolutions.
 struct MethodRun {
     GenericClass* Owner = nullptr;
     const std::pair<const char*, GenericMethod*>* Begin = nullptr;
