@@ -192,6 +192,7 @@ void BM_BoundPropertyGetOnCalledObject(benchmark::State& state) { RunLoop(state,
 // A new variable for every call, as `Instance().Method()` makes one: the first read of a
 // method on an object.
 void BM_BoundFreshObjectCall(benchmark::State& state) { RunLoop(state, "bench.Shared().Add(1)"); }
+void BM_BoundFreshObjectTwoCalls(benchmark::State& state) { RunLoop(state, "local o = bench.Shared() o.Add(1) o.Add(1)"); }
 
 BENCHMARK(BM_RawCApiMemberCall);
 BENCHMARK(BM_BoundMemberCall);
@@ -202,6 +203,7 @@ BENCHMARK(BM_RawCApiPropertyGet);
 BENCHMARK(BM_BoundPropertyGet);
 BENCHMARK(BM_BoundPropertyGetOnCalledObject);
 BENCHMARK(BM_BoundFreshObjectCall);
+BENCHMARK(BM_BoundFreshObjectTwoCalls);
 
 } // namespace
 

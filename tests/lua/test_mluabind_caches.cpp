@@ -74,10 +74,11 @@ class Caches : public ::testing::Test {
 protected:
     void SetUp() override { host.Declare(Lamps); }
 
-    // Runs a chunk after `lamp` has read methods twice, so that Lua reads through its cache.
+    // Runs a chunk after `lamp` has read methods often enough for Lua to read through its
+    // cache.
     std::string RunCached(const std::string& code)
     {
-        return host.Run("lamp = Lamp() lamp.GetLevel() lamp.Power() " + code);
+        return host.Run("lamp = Lamp() for k = 1, 8 do lamp.GetLevel() lamp.Power() end " + code);
     }
 
     LuaTestHost host;

@@ -38,7 +38,8 @@ struct LuaCustomVariable {
     i::GenericClass* Class;
     uint8_t IsOwned;
     uint8_t IsConst;
-    uint16_t Tag; // marks the userdata as one of ours
+    uint16_t Tag;             // marks the userdata as one of ours
+    uint8_t MethodReads = 0;  // how often methods were read from it (see Dispatch.cpp)
 };
 
 constexpr uint16_t kVariableTag = 0x6d6c;

@@ -20,6 +20,7 @@ LuaCustomVariable* CreateVariable(CHost& host, lua_State* L, GenericClass* cls, 
     variable->IsOwned = owned ? 1 : 0;
     variable->IsConst = is_const ? 1 : 0;
     variable->Tag = kVariableTag;
+    variable->MethodReads = 0;
     lua_rawgeti(L, LUA_REGISTRYINDEX, cls->m_MetatableRef);
     if (!lua_setmetatable(L, -2))
         host.Report("can't set metatable!\n");

@@ -275,28 +275,30 @@ void ReadThroughCache(lua_State* L, int object, int cache)
     lua_settop(L, cache);
 }
 
+// Method reads after which an object reads its method closures through a metatable of its
+// own; before, they come from its environment by a short native call.
+constexpr uint8_t ReadsBeforeOwnMetatable = 4;
+
 // Pushes the method cache of the object at `object`: a table of method closures by name, in
-// the object's environment. It is made at the first method read; from the second on, Lua
-// reads it without a native call (ReadThroughCache), so objects read once, as the result of
-// `Instance()`, don't pay for a metatable. `cache` is the cache when __index was entered
-// for a miss in it, else 0.
-void PushMethodCache(lua_State* L, int object, int cache)
+// the object's environment. It is made at the first method read; after a few more, Lua
+// reads it without a native call (ReadThroughCache), so objects read a few times, as the
+// result of `Instance()`, don't pay for a metatable. `cache` is the cache when __index was
+// entered for a miss in it, else 0.
+void PushMethodCache(lua_State* L, LuaCustomVariable& self, int object, int cache)
 {
     if (cache) {
         lua_pushvalue(L, cache);
         return;
     }
-    lua_getfenv(L, object);
-    int env = lua_gettop(L);
-    lua_pushlightuserdata(L, &g_CachedObjectKey);
-    lua_rawget(L, env);
-    bool made = lua_rawequal(L, -1, object);
-    lua_pop(L, 1);
-    if (made) {
-        ReadThroughCache(L, object, env);
+    if (self.MethodReads > 0) {
+        lua_getfenv(L, object);
+        if (self.MethodReads >= ReadsBeforeOwnMetatable)
+            ReadThroughCache(L, object, lua_gettop(L));
+        else
+            ++self.MethodReads;
         return;
     }
-    lua_pop(L, 1);
+    self.MethodReads = 1;
     lua_createtable(L, 0, 2);
     lua_pushlightuserdata(L, &g_CachedObjectKey);
     lua_pushvalue(L, object);
@@ -308,9 +310,9 @@ void PushMethodCache(lua_State* L, int object, int cache)
 // Pushes the closure of a method for the object at `object`, the one made before for the
 // name at index 2 if there is one. The closure holds the object itself, so it can outlive
 // every other reference.
-void PushMethod(CHost& host, lua_State* L, Resolution& found, int object, int cache)
+void PushMethod(CHost& host, lua_State* L, Resolution& found, LuaCustomVariable& self, int object, int cache)
 {
-    PushMethodCache(L, object, cache);
+    PushMethodCache(L, self, object, cache);
     int table = lua_gettop(L);
     lua_pushvalue(L, 2);
     lua_rawget(L, table);
@@ -348,10 +350,22 @@ int IndexBody(CHost& host, lua_State* L)
         ReportForeign(host, "MetaOperatorIndex");
         return 0;
     }
+    if (self->MethodReads > 0 && self->MethodReads < ReadsBeforeOwnMetatable) {
+        // A method read again before Lua reads the cache itself: straight from the cache.
+        int top = lua_gettop(L);
+        lua_getfenv(L, object);
+        lua_pushvalue(L, 2);
+        lua_rawget(L, -2);
+        if (lua_iscfunction(L, -1)) {
+            ++self->MethodReads;
+            return 1;
+        }
+        lua_settop(L, top);
+    }
     Resolution* found = ResolveName(host, L, *self);
     switch (found ? found->What : Resolution::Nothing) {
     case Resolution::Method:
-        PushMethod(host, L, *found, object, cache);
+        PushMethod(host, L, *found, *self, object, cache);
         return 1;
     case Resolution::Member: {
         void* object = found->Convert(self->Object);
