@@ -350,18 +350,6 @@ int IndexBody(CHost& host, lua_State* L)
         ReportForeign(host, "MetaOperatorIndex");
         return 0;
     }
-    if (self->MethodReads > 0 && self->MethodReads < ReadsBeforeOwnMetatable) {
-        // A method read again before Lua reads the cache itself: straight from the cache.
-        int top = lua_gettop(L);
-        lua_getfenv(L, object);
-        lua_pushvalue(L, 2);
-        lua_rawget(L, -2);
-        if (lua_iscfunction(L, -1)) {
-            ++self->MethodReads;
-            return 1;
-        }
-        lua_settop(L, top);
-    }
     Resolution* found = ResolveName(host, L, *self);
     switch (found ? found->What : Resolution::Nothing) {
     case Resolution::Method:
