@@ -112,8 +112,6 @@ CHost::CHost(lua_State* state, bool owns_state)
     lua_pushlightuserdata(L, &g_HostKey);
     lua_pushlightuserdata(L, this);
     lua_rawset(L, LUA_REGISTRYINDEX);
-    lua_newtable(L);
-    m_FreshEnvRef = luaL_ref(L, LUA_REGISTRYINDEX);
     RegisterHostFunctions();
 }
 
@@ -300,7 +298,8 @@ void CHost::CreateMetatable(i::GenericClass* cls)
     lua_pushcfunction(L, cls->m_GCFunction);
     lua_setfield(L, mt, "__gc");
     lua_pushlightuserdata(L, this);
-    lua_pushcclosure(L, &i::MetaOperatorIndex, 1);
+    lua_newtable(L); // what names stand for, filled as scripts read them
+    lua_pushcclosure(L, &i::MetaOperatorIndex, 2);
     lua_setfield(L, mt, "__index");
     lua_pushlightuserdata(L, this);
     lua_pushcclosure(L, &i::MetaOperatorNewIndex, 1);

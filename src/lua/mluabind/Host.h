@@ -38,7 +38,8 @@ struct LuaCustomVariable {
     i::GenericClass* Class;
     uint8_t IsOwned;
     uint8_t IsConst;
-    uint16_t Tag; // marks the userdata as one of ours
+    uint16_t Tag;             // marks the userdata as one of ours
+    uint8_t MethodReads = 0;  // how often methods were read from it (see Dispatch.cpp)
 };
 
 constexpr uint16_t kVariableTag = 0x6d6c;
@@ -95,8 +96,6 @@ public:
     void ReleaseTemporaries(size_t depth);
     // Changes whenever the class registry of any host changes; caches compare it.
     uint64_t GetStamp() const { return m_Stamp; }
-    // A shared empty table: the environment of every fresh variable (see Dispatch.cpp).
-    int GetFreshEnvironmentRef() const { return m_FreshEnvRef; }
     i::CallFrame* GetFrame() const { return m_Frame; }
     void SetFrame(i::CallFrame* frame) { m_Frame = frame; }
 
@@ -119,7 +118,6 @@ private:
     i::DeclarationArena* m_DeclarationArena;
     bool m_OwnsState;
     uint64_t m_Stamp;
-    int m_FreshEnvRef;
     i::CallFrame* m_Frame = nullptr;
 
     static CHost* m_CurrentBindingHost;

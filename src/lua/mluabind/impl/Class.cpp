@@ -61,12 +61,102 @@ const MethodRun* GenericClass::FindRun(const char* name)
             run.Owner = this;
             run.Begin = &m_Methods[k];
             run.Count = end - k;
+            run.Typed = std::all_of(run.Begin, run.Begin + run.Count,
+                                    [](const MethodEntry& entry) { return entry.second->Typed && !entry.second->SelfFirst; });
+            run.ChosenFor = 0;
             k = end;
         }
         m_RunsBuiltFor = m_Methods.size();
     }
     auto it = m_Runs.find(name);
     return it == m_Runs.end() || it->second.Count == 0 ? nullptr : &it->second;
+}
+
+namespace {
+
+constexpr int MaxSearchDepth = 32;
+
+// The overloads of `name` in the class itself, else the first found through its adapters
+// in map order; the path of `found` gets the adapters on the way.
+bool FindMethodPath(CHost& host, GenericClass* cls, const char* name, int depth, Resolution& found)
+{
+    if (const MethodRun* run = cls->FindRun(name)) {
+        found.What = Resolution::Method;
+        found.Owner = cls;
+        found.Run = run;
+        return true;
+    }
+    if (depth >= MaxSearchDepth)
+        return false;
+    for (auto& [type, adapter] : cls->m_Adapters) {
+        GenericClass* target = adapter->GetTargetGenericClass(host);
+        if (!target)
+            continue;
+        found.Path.push_back(adapter);
+        if (FindMethodPath(host, target, name, depth + 1, found))
+            return true;
+        found.Path.pop_back();
+    }
+    return false;
+}
+
+// A member, then a constant, of the class, then the same through its adapters.
+bool FindMemberPath(CHost& host, GenericClass* cls, const char* name, int depth, Resolution& found)
+{
+    found.FoundMember = cls->FindOwnMember(name);
+    found.FoundConstant = found.FoundMember ? nullptr : cls->FindOwnConstant(name);
+    if (found.FoundMember || found.FoundConstant) {
+        found.What = found.FoundMember ? Resolution::Member : Resolution::Constant;
+        found.Owner = cls;
+        return true;
+    }
+    if (depth >= MaxSearchDepth)
+        return false;
+    for (auto& [type, adapter] : cls->m_Adapters) {
+        GenericClass* target = adapter->GetTargetGenericClass(host);
+        if (!target)
+            continue;
+        found.Path.push_back(adapter);
+        if (FindMemberPath(host, target, name, depth + 1, found))
+            return true;
+        found.Path.pop_back();
+    }
+    return false;
+}
+
+} // namespace
+
+Resolution* GenericClass::Resolve(CHost& host, const char* name)
+{
+    auto it = m_Resolutions.find(name);
+    if (it != m_Resolutions.end()) {
+        if (it->second.Stamp != host.GetStamp())
+            Refresh(host, it->second);
+        return &it->second;
+    }
+    Resolution resolution;
+    resolution.Class = this;
+    resolution.Name = name;
+    Refresh(host, resolution);
+    if (resolution.What == Resolution::Nothing)
+        return nullptr; // unknown names leave nothing behind
+    return &m_Resolutions.emplace(name, std::move(resolution)).first->second;
+}
+
+void GenericClass::Refresh(CHost& host, Resolution& resolution)
+{
+    const char* name = resolution.Name.c_str();
+    resolution.Stamp = host.GetStamp();
+    resolution.What = Resolution::Nothing;
+    resolution.Owner = nullptr;
+    resolution.Run = nullptr;
+    resolution.FoundMember = nullptr;
+    resolution.FoundConstant = nullptr;
+    resolution.Path.clear();
+    // Every method of every base comes before any member. A failed search leaves the
+    // path empty.
+    if (!FindMethodPath(host, this, name, 0, resolution))
+        FindMemberPath(host, this, name, 0, resolution);
 }
 
 GenericMember* GenericClass::FindOwnMember(const char* name) const
@@ -218,6 +308,10 @@ GenericClass* ClassUpCastConvertAdapter::GetTargetGenericClass(CHost& host)
     }
     return m_TargetClass;
 }
+
+int GenericMethod::TryCall(CHost&, lua_State*, LuaCustomVariable&) { return NotTaken; }
+
+int GenericFunction::TryCall(CHost&, lua_State*) { return NotTaken; }
 
 void GenericMethodPolicy::BeforeCall(CHost&, lua_State*, LuaCustomVariable*) {}
 

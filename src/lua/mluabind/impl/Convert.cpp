@@ -20,13 +20,10 @@ LuaCustomVariable* CreateVariable(CHost& host, lua_State* L, GenericClass* cls, 
     variable->IsOwned = owned ? 1 : 0;
     variable->IsConst = is_const ? 1 : 0;
     variable->Tag = kVariableTag;
+    variable->MethodReads = 0;
     lua_rawgeti(L, LUA_REGISTRYINDEX, cls->m_MetatableRef);
     if (!lua_setmetatable(L, -2))
         host.Report("can't set metatable!\n");
-    // Every variable starts with the shared empty environment; the first method lookup
-    // gives it a table of its own for the method closures.
-    lua_rawgeti(L, LUA_REGISTRYINDEX, host.GetFreshEnvironmentRef());
-    lua_setfenv(L, -2);
     return variable;
 }
 
@@ -132,9 +129,17 @@ const char16_t* NarrowToWideRing(const char* text, size_t length)
         length = RingBufferSize - 1;
     char16_t* buffer = g_WideRing[g_WideNext];
     g_WideNext = (g_WideNext + 1) % RingSize;
-    ox::wstring wide = ox::misc::ConvertToWide(std::string_view(text, length));
-    size_t count = std::min(wide.size(), RingBufferSize - 1);
-    std::memcpy(buffer, wide.data(), count * sizeof(char16_t));
+    // Plain ASCII widens in place; anything else goes through the codec.
+    size_t count = 0;
+    while (count < length && static_cast<unsigned char>(text[count]) < 0x80) {
+        buffer[count] = static_cast<unsigned char>(text[count]);
+        ++count;
+    }
+    if (count < length) {
+        ox::wstring wide = ox::misc::ConvertToWide(std::string_view(text, length));
+        count = std::min(wide.size(), RingBufferSize - 1);
+        std::memcpy(buffer, wide.data(), count * sizeof(char16_t));
+    }
     buffer[count] = 0;
     return buffer;
 }
@@ -149,6 +154,15 @@ const char* WideToNarrowRing(const char16_t* text)
 {
     if (!text)
         return nullptr;
+    std::string& slot = g_NarrowRing[g_NarrowNext];
+    g_NarrowNext = (g_NarrowNext + 1) % RingSize;
+    // Plain ASCII narrows into the slot's own buffer; anything else goes through the codec.
+    slot.clear();
+    size_t ascii = 0;
+    while (text[ascii] && text[ascii] < 0x80)
+        slot.push_back(static_cast<char>(text[ascii++]));
+    if (!text[ascii])
+        return slot.c_str();
     std::string narrow;
     std::u16string_view rest(text, ox::misc::WideLength(text));
     while (!rest.empty()) {
@@ -159,8 +173,6 @@ const char* WideToNarrowRing(const char16_t* text)
         narrow += ox::misc::ConvertToNarrow(rest.substr(0, count));
         rest.remove_prefix(count);
     }
-    std::string& slot = g_NarrowRing[g_NarrowNext];
-    g_NarrowNext = (g_NarrowNext + 1) % RingSize;
     slot = std::move(narrow);
     return slot.c_str();
 }

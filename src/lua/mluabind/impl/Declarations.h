@@ -15,6 +15,11 @@ namespace mluabind::i {
 // A score: lower is better; NoMatch means the candidate can't be used.
 constexpr int NoMatch = 1000000;
 
+// Results of TryCall besides a result count: the values don't fit; or the signature can't
+// be scored and converted in one step, so the caller goes the long way.
+constexpr int TakeFailed = -1;
+constexpr int NotTaken = -2;
+
 // Score of a parameter list of a generated signature from stack index `start` on.
 using MatchFn = int (*)(CHost& host, lua_State* L, int start, int count, bool allow_implicit);
 // The parameter type names of a signature joined by ", ".
@@ -70,9 +75,13 @@ public:
     // Extracts the arguments from index 1 on, runs the native code on `self` and pushes the
     // result; gives the number of results.
     virtual int Call(CHost& host, lua_State* L, LuaCustomVariable& self) = 0;
+    // Scores the values from index 1 on and, when they fit, converts them and calls in the
+    // same pass (no policy, no operator); gives TakeFailed or NotTaken otherwise.
+    virtual int TryCall(CHost& host, lua_State* L, LuaCustomVariable& self);
 
     bool IsConst = false;
     bool SelfFirst = false; // operators: the object is the first value on the stack
+    bool Typed = false;     // its score depends on the Lua types of the values alone
     std::string Name;
     MatchFn MatchFunction = nullptr;
     SignatureFn SignatureFunction = nullptr;
@@ -82,6 +91,8 @@ public:
 class GenericFunction : public DeclaratedClass {
 public:
     virtual int Call(CHost& host, lua_State* L) = 0;
+    // As GenericMethod::TryCall.
+    virtual int TryCall(CHost& host, lua_State* L);
 
     MatchFn MatchFunction = nullptr;
     SignatureFn SignatureFunction = nullptr;
@@ -168,11 +179,46 @@ struct NameLess {
 
 class GenericClass;
 
-// The overloads of one name in one class, at a stable address for method closures.
+// The overloads of one name in one class, at a stable address for resolutions.
 struct MethodRun {
     GenericClass* Owner = nullptr;
     const std::pair<const char*, GenericMethod*>* Begin = nullptr;
     size_t Count = 0;
+    // Every overload is Typed: the Lua types of the values (and the object's const) decide
+    // the choice, which is kept for the last such key.
+    bool Typed = false;
+    mutable uint64_t ChosenFor = 0;
+    mutable size_t Chosen = 0;
+};
+
+// What a name read from an object of a class stands for: the first method found in the
+// class or through its adapters, else a member or constant. Made at the first read of the
+// name and kept at a stable address, since method closures hold it; made again in place
+// when the host's registry has changed since.
+struct Resolution {
+    enum Kind : uint8_t { Nothing, Method, Member, Constant };
+
+    GenericClass* Class = nullptr; // the class of the objects it serves
+    std::string Name;
+    uint64_t Stamp = 0;
+    Kind What = Nothing;
+    GenericClass* Owner = nullptr; // the class that declares what was found
+    const MethodRun* Run = nullptr;
+    GenericMember* FoundMember = nullptr;
+    GenericConstant* FoundConstant = nullptr;
+    // Adapters from Class to Owner, in the order they convert; empty when Owner is Class.
+    std::vector<ClassConvertAdapter*> Path;
+
+    // The object pointer of `Class` converted to `Owner`; null stays null.
+    void* Convert(void* object) const
+    {
+        for (ClassConvertAdapter* adapter : Path) {
+            if (!object)
+                break;
+            object = adapter->Upcast(object);
+        }
+        return object;
+    }
 };
 
 class GenericClass : public DeclaratedClass {
@@ -196,7 +242,6 @@ public:
     // The instance metatable in the Lua registry, made when the class is published.
     int m_MetatableRef = LUA_NOREF;
 
-
     void AddMethod(GenericMethod* method);
     void AddOperator(int index, GenericMethod* method);
 
@@ -219,9 +264,15 @@ public:
     // The first constructor that can build this class implicitly from the value at
     // `index`, or null.
     ConstructorDescription* FindImplicitConstructor(CHost& host, lua_State* L, int index) const;
+    // What `name` stands for on objects of this class, current with the host's registry;
+    // null for a name that never stood for anything.
+    Resolution* Resolve(CHost& host, const char* name);
+    // Brings a resolution of this class up to date with the host's registry.
+    void Refresh(CHost& host, Resolution& resolution);
 
 private:
     std::map<std::string, MethodRun, std::less<>> m_Runs;
+    std::map<std::string, Resolution, std::less<>> m_Resolutions;
     size_t m_RunsBuiltFor = 0;
 };
 

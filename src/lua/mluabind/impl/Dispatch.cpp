@@ -4,6 +4,7 @@
 
 #include "lua/mluabind/Binding.h"
 
+#include <algorithm>
 #include <exception>
 #include <string>
 
@@ -125,30 +126,63 @@ int InvokeMethod(CHost& host, lua_State* L, GenericMethod* method, LuaCustomVari
     return results;
 }
 
+// The Lua types of the values on the stack and the const of the object, as a key for the
+// choice among typed overloads; 0 when there are too many values for a key.
+uint64_t TypeKey(lua_State* L, bool is_const)
+{
+    int top = lua_gettop(L);
+    if (top > 14)
+        return 0;
+    uint64_t key = uint64_t{1} << 63 | uint64_t{is_const} << 62 | uint64_t(top) << 56;
+    for (int index = 1; index <= top; ++index)
+        key |= uint64_t(lua_type(L, index) + 1) << (4 * (index - 1));
+    return key;
+}
+
 // Picks the overload with the lowest score among a run of methods or operators; runs it
-// when it is the only one, else reports the candidates and the arguments.
+// when it is the only one, else reports the candidates and the arguments. With a typed
+// run of a class, the choice is kept for the next call with the same key.
 template <class Entry>
 int MethodCallDispatcher(CHost& host, lua_State* L, LuaCustomVariable& view, LuaCustomVariable* self,
-                         const Entry* run, size_t count, const char* name)
+                         const Entry* run, size_t count, const char* name, const MethodRun* typed = nullptr)
 {
     GenericMethod* candidates[MaxMethodCandidates];
     int found = 0;
     int best = NoMatch;
+    uint64_t key = 0;
     if (count == 1) {
-        // The common case needs no candidate list.
+        // The common case: one overload, scored and converted in one pass where it can be.
         GenericMethod* method = run[0].second;
-        best = MatchMethod(host, L, method, view, self);
-        if (best < NoMatch)
-            return InvokeMethod(host, L, method, view, self);
+        int results = NotTaken;
+        if (!method->Policy && !method->SelfFirst && !(view.IsConst && !method->IsConst))
+            results = method->TryCall(host, L, view);
+        if (results >= 0)
+            return results;
+        if (results == NotTaken) {
+            best = MatchMethod(host, L, method, view, self);
+            if (best < NoMatch)
+                return InvokeMethod(host, L, method, view, self);
+        }
         candidates[found++] = method;
         count = 0;
+    } else if (typed && typed->Typed) {
+        key = TypeKey(L, view.IsConst != 0);
+        if (key && key == typed->ChosenFor)
+            return InvokeMethod(host, L, run[typed->Chosen].second, view, self);
     }
     for (size_t k = 0; k < count; ++k) {
         GenericMethod* method = run[k].second;
         KeepBest(method, MatchMethod(host, L, method, view, self), candidates, MaxMethodCandidates, found, best);
     }
-    if (best != NoMatch && found == 1)
+    if (best != NoMatch && found == 1) {
+        if (key) {
+            typed->Chosen = static_cast<size_t>(std::find_if(run, run + count, [&](const Entry& entry) {
+                                                    return entry.second == candidates[0];
+                                                }) - run);
+            typed->ChosenFor = key;
+        }
         return InvokeMethod(host, L, candidates[0], view, self);
+    }
 
     std::string lines;
     for (int k = 0; k < found; ++k) {
@@ -164,75 +198,6 @@ int MethodCallDispatcher(CHost& host, lua_State* L, LuaCustomVariable& view, Lua
                 view.Class->FullName.c_str(), name, view.IsConst ? " const" : "", lines.c_str(),
                 DescribeParameters(L, 1).c_str(), Cause(best));
     return 0;
-}
-
-// The overloads of `name` in the class itself, else the first found through its adapters
-// in map order.
-const MethodRun* FindMethod(CHost& host, GenericClass* cls, const char* name, int depth)
-{
-    if (const MethodRun* run = cls->FindRun(name))
-        return run;
-    if (depth >= MaxSearchDepth)
-        return nullptr;
-    for (auto& [type, adapter] : cls->m_Adapters) {
-        GenericClass* target = adapter->GetTargetGenericClass(host);
-        if (!target)
-            continue;
-        if (const MethodRun* run = FindMethod(host, target, name, depth + 1))
-            return run;
-    }
-    return nullptr;
-}
-
-// Converts an object pointer of `from` to the class `to` that was found through adapters.
-void* UpcastTo(CHost& host, GenericClass* from, GenericClass* to, void* object, int depth)
-{
-    if (from == to || !object)
-        return object;
-    if (from->CanUpcast(*to->m_Type))
-        return from->Upcast(host, *to->m_Type, object);
-    if (depth >= MaxSearchDepth)
-        return nullptr;
-    // No stored path (a base published after its derived class): walk the adapters.
-    for (auto& [type, adapter] : from->m_Adapters) {
-        GenericClass* target = adapter->GetTargetGenericClass(host);
-        if (!target)
-            continue;
-        if (void* result = UpcastTo(host, target, to, adapter->Upcast(object), depth + 1))
-            return result;
-    }
-    return nullptr;
-}
-
-// Members and constants of the class, then of the classes behind its adapters.
-bool FindMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& view, const char* name, int& results,
-                int depth)
-{
-    if (GenericMember* member = cls->FindOwnMember(name)) {
-        if (!view.Object) {
-            ReportNull(host, "MetaOperatorIndex", cls);
-            results = 0;
-        } else {
-            results = member->Get(host, L, view);
-        }
-        return true;
-    }
-    if (GenericConstant* constant = cls->FindOwnConstant(name)) {
-        constant->Push(host, L);
-        results = 1;
-        return true;
-    }
-    if (depth >= MaxSearchDepth)
-        return false;
-    for (auto& [type, adapter] : cls->m_Adapters) {
-        GenericClass* target = adapter->GetTargetGenericClass(host);
-        if (!target)
-            continue;
-        LuaCustomVariable base{view.Object ? adapter->Upcast(view.Object) : nullptr, target, 0, view.IsConst, kVariableTag};
-        if (FindMember(host, L, target, base, name, results, depth + 1))
-            return true;
-    }
-    return false;
 }
 
 bool SetMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& view, const char* name, int depth)
@@ -257,45 +222,155 @@ bool SetMember(CHost& host, lua_State* L, GenericClass* cls, LuaCustomVariable& 
     return false;
 }
 
+// Key of the object in its own method cache (see PushMethodCache); no script can make a
+// light userdata of this address.
+char g_CachedObjectKey;
+
+// The resolution of the name at index 2 for the variable: from the class's table of names
+// (upvalue 2 of __index) when it is current, else made and entered there; null for an
+// unknown name.
+Resolution* ResolveName(CHost& host, lua_State* L, LuaCustomVariable& self)
+{
+    int names = lua_upvalueindex(2);
+    lua_pushvalue(L, 2);
+    lua_rawget(L, names); // stays on the stack: results go on top of it
+    auto* known = static_cast<Resolution*>(lua_touserdata(L, -1));
+    if (known && known->Class == self.Class && known->Stamp == host.GetStamp())
+        return known;
+    Resolution* resolution = self.Class->Resolve(host, lua_tostring(L, 2));
+    if (resolution && lua_istable(L, names)) {
+        lua_pushvalue(L, 2);
+        lua_pushlightuserdata(L, resolution);
+        lua_rawset(L, names);
+    }
+    return resolution;
+}
+
+// Gives the object at `object` a metatable of its own, a copy of its class's whose __index
+// is the cache at `cache`. Misses in the cache fall through to the class's __index, which
+// finds the object in the cache.
+void ReadThroughCache(lua_State* L, int object, int cache)
+{
+    if (!lua_getmetatable(L, object))
+        return;
+    int mt = lua_gettop(L);
+    lua_getfield(L, mt, "__index");
+    bool own_already = lua_istable(L, -1); // __index called directly by a script
+    lua_settop(L, own_already ? cache : mt);
+    if (own_already)
+        return;
+    lua_pushvalue(L, mt);
+    lua_setmetatable(L, cache);
+    lua_createtable(L, 0, 8);
+    int own = lua_gettop(L);
+    lua_pushnil(L);
+    while (lua_next(L, mt)) {
+        lua_pushvalue(L, -2);
+        lua_insert(L, -2);
+        lua_rawset(L, own);
+    }
+    lua_pushvalue(L, cache);
+    lua_setfield(L, own, "__index");
+    lua_setmetatable(L, object);
+    lua_settop(L, cache);
+}
+
+// Method reads after which an object reads its method closures through a metatable of its
+// own; before, they come from its environment by a short native call.
+constexpr uint8_t ReadsBeforeOwnMetatable = 4;
+
+// Pushes the method cache of the object at `object`: a table of method closures by name, in
+// the object's environment. It is made at the first method read; after a few more, Lua
+// reads it without a native call (ReadThroughCache), so objects read a few times, as the
+// result of `Instance()`, don't pay for a metatable. `cache` is the cache when __index was
+// entered for a miss in it, else 0.
+void PushMethodCache(lua_State* L, LuaCustomVariable& self, int object, int cache)
+{
+    if (cache) {
+        lua_pushvalue(L, cache);
+        return;
+    }
+    if (self.MethodReads > 0) {
+        lua_getfenv(L, object);
+        if (self.MethodReads >= ReadsBeforeOwnMetatable)
+            ReadThroughCache(L, object, lua_gettop(L));
+        else
+            ++self.MethodReads;
+        return;
+    }
+    self.MethodReads = 1;
+    lua_createtable(L, 0, 2);
+    lua_pushlightuserdata(L, &g_CachedObjectKey);
+    lua_pushvalue(L, object);
+    lua_rawset(L, -3);
+    lua_pushvalue(L, -1);
+    lua_setfenv(L, object);
+}
+
+// Pushes the closure of a method for the object at `object`, the one made before for the
+// name at index 2 if there is one. The closure holds the object itself, so it can outlive
+// every other reference.
+void PushMethod(CHost& host, lua_State* L, Resolution& found, LuaCustomVariable& self, int object, int cache)
+{
+    PushMethodCache(L, self, object, cache);
+    int table = lua_gettop(L);
+    lua_pushvalue(L, 2);
+    lua_rawget(L, table);
+    if (lua_iscfunction(L, -1))
+        return;
+    lua_pop(L, 1);
+    lua_pushlightuserdata(L, &host);
+    lua_pushvalue(L, object);
+    lua_pushlightuserdata(L, &found);
+    lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3);
+    lua_pushvalue(L, 2);
+    lua_pushvalue(L, -2);
+    lua_rawset(L, table);
+}
+
 int IndexBody(CHost& host, lua_State* L)
 {
     if (lua_type(L, 2) != LUA_TSTRING) {
         host.Report("MetaOperatorIndex: panic - currently supports only string indexes.\n");
         return 0;
     }
-    LuaCustomVariable* self = ToVariable(L, 1);
+    int object = 1;
+    int cache = 0;
+    int type = lua_type(L, 1);
+    if (type == LUA_TTABLE) {
+        // A miss in an object's method cache: the object is in the cache.
+        cache = 1;
+        lua_pushlightuserdata(L, &g_CachedObjectKey);
+        lua_rawget(L, cache);
+        object = lua_gettop(L);
+        type = lua_type(L, object);
+    }
+    LuaCustomVariable* self = type == LUA_TUSERDATA ? UserdataVariable(L, object) : nullptr;
     if (!self) {
         ReportForeign(host, "MetaOperatorIndex");
         return 0;
     }
-    lua_settop(L, 2);
-    const char* name = lua_tostring(L, 2);
-    if (const MethodRun* run = FindMethod(host, self->Class, name, 0)) {
-        // The closure holds the object itself, so it can outlive every other reference;
-        // it waits in the object's own environment table for the next lookup.
-        lua_pushlightuserdata(L, &host);
-        lua_pushvalue(L, 1);
-        lua_pushlightuserdata(L, const_cast<MethodRun*>(run));
-        lua_pushcclosure(L, &LuaMethodCallProxieFunction, 3); // 3
-        lua_getfenv(L, 1);                                     // 4
-        lua_rawgeti(L, LUA_REGISTRYINDEX, host.GetFreshEnvironmentRef());
-        if (lua_rawequal(L, 4, 5)) {
-            lua_newtable(L);
-            lua_replace(L, 4);
-            lua_pushvalue(L, 4);
-            lua_setfenv(L, 1);
-        }
-        lua_settop(L, 4);
-        lua_pushvalue(L, 2);
-        lua_pushvalue(L, 3);
-        lua_rawset(L, 4);
-        lua_settop(L, 3);
+    Resolution* found = ResolveName(host, L, *self);
+    switch (found ? found->What : Resolution::Nothing) {
+    case Resolution::Method:
+        PushMethod(host, L, *found, *self, object, cache);
         return 1;
+    case Resolution::Member: {
+        void* object = found->Convert(self->Object);
+        if (!object) {
+            ReportNull(host, "MetaOperatorIndex", found->Owner);
+            return 0;
+        }
+        LuaCustomVariable view{object, found->Owner, 0, self->IsConst, kVariableTag};
+        return found->FoundMember->Get(host, L, view);
     }
-    int results = 0;
-    if (FindMember(host, L, self->Class, *self, name, results, 0))
-        return results;
-    host.Report("MetaOperatorIndex: error - unknown symbol %s.\n", name);
+    case Resolution::Constant:
+        found->FoundConstant->Push(host, L);
+        return 1;
+    case Resolution::Nothing:
+        break;
+    }
+    host.Report("MetaOperatorIndex: error - unknown symbol %s.\n", lua_tostring(L, 2));
     return 0;
 }
 
@@ -332,19 +407,21 @@ int ReadOnlyBody(CHost& host, lua_State* L)
 int MethodCallBody(CHost& host, lua_State* L)
 {
     auto* self = static_cast<LuaCustomVariable*>(lua_touserdata(L, lua_upvalueindex(2)));
-    auto* run = static_cast<const MethodRun*>(lua_touserdata(L, lua_upvalueindex(3)));
-    if (!run || run->Count == 0) {
-        host.Report("GenericClass::LuaMethodCallProxieFunction: panic - can't find GenericMethod %s!\n", "?");
+    auto* found = static_cast<Resolution*>(lua_touserdata(L, lua_upvalueindex(3)));
+    if (found->Stamp != host.GetStamp())
+        found->Class->Refresh(host, *found);
+    if (found->What != Resolution::Method || found->Run->Count == 0) {
+        host.Report("GenericClass::LuaMethodCallProxieFunction: panic - can't find GenericMethod %s!\n", found->Name.c_str());
         return 0;
     }
-    GenericClass* owner = run->Owner;
-    void* object = self->Class == owner ? self->Object : UpcastTo(host, self->Class, owner, self->Object, 0);
+    void* object = found->Convert(self->Object);
     if (!object) {
-        ReportNull(host, "GenericClass::LuaMethodCallProxieFunction", owner);
+        ReportNull(host, "GenericClass::LuaMethodCallProxieFunction", found->Owner);
         return 0;
     }
-    LuaCustomVariable view{object, owner, 0, self->IsConst, kVariableTag};
-    return MethodCallDispatcher(host, L, view, self, run->Begin, run->Count, run->Begin->first);
+    const MethodRun* run = found->Run;
+    LuaCustomVariable view{object, found->Owner, 0, self->IsConst, kVariableTag};
+    return MethodCallDispatcher(host, L, view, self, run->Begin, run->Count, run->Begin->first, run);
 }
 
 bool HasOperator(const LuaCustomVariable* variable, int index)
@@ -423,6 +500,11 @@ int FunctionBody(CHost& host, lua_State* L)
     if (!overloads || overloads->empty()) {
         host.Report("LuaGlobalFunctionDispatcher: panic - can't find GenericFunction %s!\n", name ? name : "");
         return 0;
+    }
+    if (overloads->size() == 1 && !overloads->front()->Policy) {
+        int results = overloads->front()->TryCall(host, L);
+        if (results >= 0)
+            return results;
     }
     GenericFunction* candidates[MaxFunctionCandidates];
     int found = 0;
@@ -557,19 +639,7 @@ int GetRttiTypeBody(CHost&, lua_State* L) { return TypeBody(L, false, true); }
 
 } // namespace
 
-int MetaOperatorIndex(lua_State* L)
-{
-    // Fast path without a call frame: a method closure made before for this object.
-    if (lua_type(L, 1) == LUA_TUSERDATA && lua_type(L, 2) == LUA_TSTRING) {
-        lua_getfenv(L, 1);
-        lua_pushvalue(L, 2);
-        lua_rawget(L, -2);
-        if (!lua_isnil(L, -1))
-            return 1;
-        lua_settop(L, 2);
-    }
-    return Entry<&IndexBody>(L);
-}
+int MetaOperatorIndex(lua_State* L) { return Entry<&IndexBody>(L); }
 int MetaOperatorNewIndex(lua_State* L) { return Entry<&NewIndexBody>(L); }
 int MetaOperatorReadOnly(lua_State* L) { return Entry<&ReadOnlyBody>(L); }
 int LuaMethodCallProxieFunction(lua_State* L) { return Entry<&MethodCallBody>(L); }

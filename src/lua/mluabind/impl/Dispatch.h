@@ -5,6 +5,7 @@
 
 namespace mluabind::i {
 
+// __index of bound objects (upvalue 2: the table of what names stand for in the class).
 int MetaOperatorIndex(lua_State* L);
 int MetaOperatorNewIndex(lua_State* L);
 // __newindex of the face of a protected metatable (upvalue 2: the name it reports).

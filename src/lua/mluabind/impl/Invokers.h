@@ -110,6 +110,7 @@ public:
         MatchFunction = &B::Args::Match;
         SignatureFunction = &B::Args::Signature;
         Policy = policy;
+        Typed = B::Args::Typed;
     }
 
     int Call(CHost& host, lua_State* L, LuaCustomVariable& self) override
@@ -117,13 +118,30 @@ public:
         typename B::Args::Storage storage;
         if (!B::Args::Extract(host, L, 1, storage))
             return 0;
+        return Run(host, L, self, storage);
+    }
+
+    int TryCall(CHost& host, lua_State* L, LuaCustomVariable& self) override
+    {
+        if constexpr (B::Args::Taken) {
+            typename B::Args::Storage storage;
+            if (B::Args::Take(L, 1, storage) >= NoMatch)
+                return TakeFailed;
+            return Run(host, L, self, storage);
+        } else {
+            return GenericMethod::TryCall(host, L, self);
+        }
+    }
+
+private:
+    int Run(CHost& host, lua_State* L, LuaCustomVariable& self, typename B::Args::Storage& storage)
+    {
         constexpr size_t count = std::tuple_size_v<typename B::Args::Storage>;
         return CallAndPush<typename B::Result>(host, L, [&]() -> decltype(auto) {
             return B::Invoke(m_Fn, self.Object, storage, std::make_index_sequence<count>());
         });
     }
 
-private:
     F m_Fn;
 };
 
@@ -165,13 +183,30 @@ public:
         typename B::Args::Storage storage;
         if (!B::Args::Extract(host, L, 1, storage))
             return 0;
+        return Run(host, L, storage);
+    }
+
+    int TryCall(CHost& host, lua_State* L) override
+    {
+        if constexpr (B::Args::Taken) {
+            typename B::Args::Storage storage;
+            if (B::Args::Take(L, 1, storage) >= NoMatch)
+                return TakeFailed;
+            return Run(host, L, storage);
+        } else {
+            return GenericFunction::TryCall(host, L);
+        }
+    }
+
+private:
+    int Run(CHost& host, lua_State* L, typename B::Args::Storage& storage)
+    {
         constexpr size_t count = std::tuple_size_v<typename B::Args::Storage>;
         return CallAndPush<typename B::Result>(host, L, [&]() -> decltype(auto) {
             return B::Invoke(m_Fn, storage, std::make_index_sequence<count>());
         });
     }
 
-private:
     F m_Fn;
 };
 

@@ -6,10 +6,15 @@
 //   Storage / Extract(host, L, index, storage)  the native value (false: reported failure)
 //   Get(storage)  the argument as P
 //   AppendName(host, text)  the type's name in signatures
+// and, for values whose score depends on the Lua type alone (numbers, bool, text):
+//   Typed = true
+//   Take(L, index, storage)  the score, and the native value when it is usable, in one step
 // PushResult<R>(host, L, value) pushes a result of declared type R.
 #include "lua/mluabind/impl/Declarations.h"
 
+#include <concepts>
 #include <string>
+#include <tuple>
 #include <type_traits>
 #include <typeinfo>
 #include <utility>
@@ -18,13 +23,19 @@ namespace mluabind::i {
 
 // --- helpers implemented in Convert.cpp ---
 
-// The bound variable at `index`, or null for anything that isn't one of ours.
-inline LuaCustomVariable* ToVariable(lua_State* L, int index)
+// The bound variable of the full userdata at `index`, or null when it isn't one of ours.
+inline LuaCustomVariable* UserdataVariable(lua_State* L, int index)
 {
-    if (lua_type(L, index) != LUA_TUSERDATA || lua_objlen(L, index) != sizeof(LuaCustomVariable))
+    if (lua_objlen(L, index) != sizeof(LuaCustomVariable))
         return nullptr;
     auto* variable = static_cast<LuaCustomVariable*>(lua_touserdata(L, index));
     return variable->Tag == kVariableTag ? variable : nullptr;
+}
+
+// The bound variable at `index`, or null for anything that isn't one of ours.
+inline LuaCustomVariable* ToVariable(lua_State* L, int index)
+{
+    return lua_type(L, index) == LUA_TUSERDATA ? UserdataVariable(L, index) : nullptr;
 }
 
 // Pushes a new variable with the class's metatable.
@@ -128,6 +139,20 @@ struct Param<P> {
             out = NumberFromLua<T>(lua_tonumber(L, index));
         return true;
     }
+    static constexpr bool Typed = true;
+    static int Take(lua_State* L, int index, Storage& out)
+    {
+        int type = lua_type(L, index);
+        if (type == LUA_TNUMBER) {
+            out = NumberFromLua<T>(lua_tonumber(L, index));
+            return 1;
+        }
+        if (type == LUA_TBOOLEAN) {
+            out = static_cast<T>(lua_toboolean(L, index) ? 1 : 0);
+            return 2;
+        }
+        return NoMatch;
+    }
     static const T& Get(const Storage& s) { return s; }
     static void AppendName(CHost&, std::string& text) { text += NumberName<T>(); }
 };
@@ -145,6 +170,20 @@ struct Param<P> {
     {
         out = lua_type(L, index) == LUA_TNUMBER ? lua_tonumber(L, index) != 0 : lua_toboolean(L, index) != 0;
         return true;
+    }
+    static constexpr bool Typed = true;
+    static int Take(lua_State* L, int index, Storage& out)
+    {
+        int type = lua_type(L, index);
+        if (type == LUA_TBOOLEAN) {
+            out = lua_toboolean(L, index) != 0;
+            return 1;
+        }
+        if (type == LUA_TNUMBER) {
+            out = lua_tonumber(L, index) != 0;
+            return 2;
+        }
+        return NoMatch;
     }
     static bool Get(Storage s) { return s; }
     static void AppendName(CHost&, std::string& text) { text += "bool"; }
@@ -181,6 +220,13 @@ struct Param<const char*> {
         out = lua_type(L, index) == LUA_TSTRING ? lua_tostring(L, index) : nullptr;
         return true;
     }
+    static constexpr bool Typed = true;
+    static int Take(lua_State* L, int index, Storage& out)
+    {
+        int type = lua_type(L, index);
+        out = type == LUA_TSTRING ? lua_tostring(L, index) : nullptr;
+        return type == LUA_TSTRING || type == LUA_TNIL ? 1 : NoMatch;
+    }
     static const char* Get(Storage s) { return s; }
     static void AppendName(CHost&, std::string& text) { text += "const char*"; }
 };
@@ -210,6 +256,7 @@ struct Param<const char16_t*> {
     }
     static const char16_t* Get(Storage s) { return s; }
     static void AppendName(CHost&, std::string& text) { text += "const wchar_t*"; }
+    static constexpr bool Typed = true;
 };
 
 // Bound classes: by value, by reference, by pointer, const or not.
@@ -261,9 +308,21 @@ struct Param<P> {
 
 // --- whole parameter lists ---
 
+template <class P>
+concept TypedParam = requires { requires Param<P>::Typed; };
+
+template <class P>
+concept TakenParam = TypedParam<P> && requires(lua_State* L, typename Param<P>::Storage& out) {
+    { Param<P>::Take(L, 1, out) } -> std::same_as<int>;
+};
+
 template <class... A>
 struct ParamList {
     static constexpr int Count = sizeof...(A);
+    // Every score depends on the Lua types of the values alone.
+    static constexpr bool Typed = (TypedParam<A> && ...);
+    // Every value is scored and converted in one step, without side effects.
+    static constexpr bool Taken = (TakenParam<A> && ...);
 
     // Scores multiply; a candidate that can't be used stops the walk.
     static int Match(CHost& host, lua_State* L, int start, int count, bool allow_implicit)
@@ -307,6 +366,24 @@ struct ParamList {
     }
 
     using Storage = std::tuple<typename Param<A>::Storage...>;
+
+    // Match and Extract in one pass, for Taken lists: exactly Count values from `start`.
+    static int Take(lua_State* L, int start, Storage& storage)
+    {
+        static_assert(Taken);
+        if (lua_gettop(L) - start + 1 != Count)
+            return NoMatch;
+        return TakeFrom(L, start, storage, std::index_sequence_for<A...>());
+    }
+
+    template <size_t... I>
+    static int TakeFrom(lua_State* L, int start, Storage& storage, std::index_sequence<I...>)
+    {
+        (void)L, (void)start, (void)storage;
+        int score = 1;
+        bool fits = ((score *= Param<A>::Take(L, start + static_cast<int>(I), std::get<I>(storage)), score < NoMatch) && ...);
+        return fits ? score : NoMatch;
+    }
 
     // Extracts from the last parameter to the first.
     static bool Extract(CHost& host, lua_State* L, int start, Storage& storage)
