@@ -15,7 +15,8 @@ TEST(DemoContent, TexturesAndDumpsRegenerateByteForByte)
     ASSERT_EQ(WEXITSTATUS(status), 0) << oxtest::ReadFile(out / "log.txt");
     const char* files[] = {"textures/demo_spinner.png", "textures/demo_disc.png", "textures/demo_frame.png",
                            "textures/demo_stone.pvr", "properties/resources.bindump",
-                           "properties/texturesalpha.bindump", "properties/clips.bindump"};
+                           "properties/texturesalpha.bindump", "properties/clips.bindump",
+                           "properties/particles.bindump"};
     for (const char* file : files) {
         ASSERT_TRUE(fs::exists(out / file)) << file;
         EXPECT_TRUE(oxtest::ReadFile(out / file) == oxtest::ReadFile(fs::path(OX_DEMO_GAME) / file))
