@@ -88,8 +88,10 @@ bool SetField(ParticleDesc& record, const Field& field, const char* value)
         return end != value;
     }
     case Kind::Text:
+        if (strlen(value) >= misc::StringA88::kCapacity)
+            return false;
         *reinterpret_cast<misc::StringA88*>(at) = value;
-        return strlen(value) < misc::StringA88::kCapacity;
+        return true;
     }
     return false;
 }

@@ -307,6 +307,14 @@ TEST(ParticleTable, BadDumpsAndRecordsAreRefused)
     EXPECT_FALSE(system.LoadDesc(records[0]));
     EXPECT_TRUE(log.Contains("particle 'mad' holds a number that is not finite"));
 
+    // An id longer than a record holds is refused, not cut.
+    oxtest::AssertCapture asserts;
+    const auto longId = Convert("<particle id=\"" + std::string(100, 'x') + "\" emission=\"3\"/>");
+    ASSERT_EQ(longId.size(), 1u);
+    EXPECT_EQ(asserts.Count(), 0u);
+    EXPECT_TRUE(longId[0].id.empty());
+    EXPECT_TRUE(log.Contains("particle '': cannot read 'id'"));
+
     // Without a dump the XML stands, and a table built from it is saved.
     std::filesystem::remove(dir / "properties/particles.bindump");
     ASSERT_TRUE(loader.Load());
