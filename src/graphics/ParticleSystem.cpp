@@ -409,12 +409,13 @@ void CParticleSystem::Render(CRenderer* renderer)
         }
         const int half = p.LifeTime >> 1;
         const bool late = p.Age >= half;
-        const float t = half == 0 ? 1.0f : late ? float(p.Age - half) / half : float(p.Age) / half;
+        // A particle emitted past its own life within a step stands at its end colour.
+        const float t = half == 0 ? 1.0f : std::min(late ? float(p.Age - half) / half : float(p.Age) / half, 1.0f);
         const uint8_t* from = late ? p.MidColor : p.StartColor;
         const uint8_t* to = late ? p.EndColor : p.MidColor;
         uint32_t channel[4];
         for (int ch = 0; ch < 4; ++ch)
-            channel[ch] = static_cast<uint32_t>((from[ch] + (to[ch] - from[ch]) * t) * k[ch]);
+            channel[ch] = Channel((from[ch] + (to[ch] - from[ch]) * t) * k[ch]);
         const uint32_t diffuse = channel[3] << 24 | channel[0] << 16 | channel[1] << 8 | channel[2];
         auto corner = [&](float dx, float dy, float tu, float tv) {
             const float x = p.Pos.X + dx * c - dy * s, y = p.Pos.Y + dx * s + dy * c;

@@ -217,6 +217,26 @@ TEST(ParticleRender, QuadsOnTheDevice)
     EXPECT_EQ(v[0].diffuse, 0x80FF0000u);
     EXPECT_EQ(backend->draws[0].destBlend, BlendFactorOne) << "additive";
 
+    // Particles emitted past their own life within a step still draw the end colour, not beyond it.
+    ParticleDesc late = Record(1000, 1000, 0, ox::core::ParticleBurst);
+    late.life_time_min = 0;
+    late.tex_id = "dot";
+    late.start_color = late.mid_color = Color(0u);
+    late.end_color = Color(0xFFFFFFFFu);
+    late.base_var_color = Color(0u);
+    CParticleSystem fading;
+    ASSERT_TRUE(fading.LoadDesc(late));
+    fading.Emit(1000);
+    backend->draws.clear();
+    fading.Render(renderer.get());
+    renderer->Flush();
+    ASSERT_FALSE(backend->draws.empty());
+    for (const auto& draw : backend->draws)
+        for (const auto& vertex : draw.vertices) {
+            const uint32_t grey = vertex.diffuse & 0xFF;
+            ASSERT_EQ(vertex.diffuse, grey * 0x01010101u) << std::hex << vertex.diffuse;
+        }
+
     // A record naming a texture that is not there: logged, runs, draws nothing.
     oxtest::LogCapture log;
     d.tex_id = "gone";
