@@ -1,5 +1,5 @@
 #!/bin/sh
-# Regenerates the demo game's textures, texture dumps and clips dump with the content tools;
+# Regenerates the demo game's textures, texture dumps, clips and particles dumps with the content tools;
 # the same tools give the same bytes, so the files in this folder can be checked against a run.
 #
 #   games/demo/make-textures.sh [TOOLS_DIR [OUT_DIR]]
@@ -38,3 +38,4 @@ trap 'rm -rf "$scratch"' EXIT
 "$tools/oxdump" resources "$here/properties/resources.xml" "$out/properties/resources.bindump" --root "$out" >/dev/null
 "$tools/oxdump" texturesalpha "$out/textures" "$out/properties/texturesalpha.bindump" >/dev/null
 "$tools/oxdump" clips "$here/properties/clips.xml" "$out/properties/clips.bindump" >/dev/null
+"$tools/oxdump" particles "$here/properties/particle.xml" "$out/properties/particles.bindump" >/dev/null

@@ -1,6 +1,7 @@
 #include "game/App.h"
 
 #include "core/FontManager.h"
+#include "core/ParticlesLoader.h"
 #include "core/ScriptVocabulary.h"
 #include "core/SettingsReaders.h"
 #include "core/TextureDeclarations.h"
@@ -17,6 +18,7 @@
 #include "gui/WidgetFactory.h"
 #include "lua/LuaHeap.h"
 #include "graphics/Font.h"
+#include "graphics/ParticleSystem.h"
 #include "misc/Unicode.h"
 #include "misc/animation/Clip.h"
 #include "misc/animation/ClipServices.h"
@@ -186,6 +188,10 @@ bool CApp::Init()
     if (g_ShowFps)
         core::ReadWString(settings, "show_fps_font", g_ShowFpsFont);
 
+    // Particle systems find their textures among the declared ones when they start.
+    core::CParticlesLoader::Instance().Load();
+    graphics::CParticleSystem::SetTextureLookup(
+        [](const char* id) -> const graphics::CTexture* { return core::CTextureManager::Instance().GetItem(id); });
     misc::anim::CClipsLoader::Instance().Load();
     m_ResourceDeclarations.Load("properties/fonts.xml", nullptr);
     LoadTextures();

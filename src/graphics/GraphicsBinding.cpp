@@ -2,6 +2,7 @@
 
 #include "graphics/Font.h"
 #include "graphics/Image.h"
+#include "graphics/ParticleSystem.h"
 #include "graphics/Renderer.h"
 #include "lua/mluabind/StdBinding.h"
 
@@ -169,6 +170,34 @@ mluabind::i::GenericClass& ImageClass()
         .Constant("FlagIntDest", static_cast<int>(I::FlagIntDest));
 }
 
+// A script makes a system, gives it a timer of its own and loads a record by id.
+mluabind::i::GenericClass& ParticleClass()
+{
+    using P = CParticleSystem;
+    auto& cls = Class<P>("CParticleSystem")
+                    .Constructor<>()
+                    .Method("IsStopEmit", [](const P& p) { return (p.GetFlags() & core::ParticleEmissionOff) != 0; })
+                    .Method("IsContinuous", [](const P& p) { return (p.GetFlags() & core::ParticleEndless) != 0; })
+                    .Method("LoadById", [](P& p, const misc::StringA88& id) { return p.LoadById(id.c_str()); })
+                    .Method("Reset", &P::Reset)
+                    .Method("Update", &P::Update)
+                    .Method("Render", &P::Render)
+                    .Method("GetLifeParticlesCount", &P::GetLifeParticlesCount)
+                    .Method("DropOldPos", &P::DropOldPos)
+                    .Method("IsDead", &P::IsDead)
+                    .Method("GetFlags", &P::GetFlags)
+                    .Method("SetFlags", &P::SetFlags)
+                    .Method("GetEmission", &P::GetEmission)
+                    .Method("SetEmission", &P::SetEmission)
+                    .Method("GetEmiterSize", &P::GetEmiterSize)
+                    .Method("SetEmiterSize", &P::SetEmiterSize)
+                    .Method("SetTimer", [](P& p, core::CTimer* timer) { p.SetTimer(timer); })
+                    .Method("SetLocation", &P::SetLocation);
+    cls.Constant("IsStopEmit", static_cast<int>(core::ParticleEmissionOff));
+    cls.Constant("IsContinuous", static_cast<int>(core::ParticleEndless));
+    return cls;
+}
+
 } // namespace
 
 void BindGraphics(mluabind::CHost& host)
@@ -177,6 +206,7 @@ void BindGraphics(mluabind::CHost& host)
     graphics.Merge(ValueClasses()).Merge(TextureClasses());
     graphics.AddClass(RendererClass());
     graphics.AddClass(ImageClass());
+    graphics.AddClass(ParticleClass());
     host.Bind(mluabind::Namespace("ox").Merge(graphics));
 }
 

@@ -17,7 +17,8 @@ TEST(DemoContent, TexturesAndDumpsRegenerateByteForByte)
                            "textures/demo_stone.pvr", "textures/menu_button.png", "textures/menu_box.png",
                            "textures/menu_tick.png", "textures/menu_bar_frame.png", "textures/menu_bar.png",
                            "textures/menu_back.png", "textures/menu_tip_back.png", "properties/resources.bindump",
-                           "properties/texturesalpha.bindump", "properties/clips.bindump"};
+                           "properties/texturesalpha.bindump", "properties/clips.bindump",
+                           "properties/particles.bindump"};
     for (const char* file : files) {
         ASSERT_TRUE(fs::exists(out / file)) << file;
         EXPECT_TRUE(oxtest::ReadFile(out / file) == oxtest::ReadFile(fs::path(OX_DEMO_GAME) / file))

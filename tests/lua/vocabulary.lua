@@ -137,7 +137,7 @@ V.required = {
             "GetFlipFlags", "AddFlipFlags", "RemFlipFlags", "SetFlipFlags", "GetCustomFlags", "AddCustomFlags",
             "RemCustomFlags", "SetCustomFlags", "GetLocation", "IsContains", "IsSnapToPath", "SetUserFlags",
             "GetUserFlags", "SetVisible", "IsVisible", "GetType", "GetState", "GetResourceId", "DisableSounds",
-            "StopAllSounds",
+            "StopAllSounds", "SnapToPath", "SetPath", "GetPath", "Load", "LoadPathHelper",
             constants = { AnimationStatePlaying = 0, AnimationStatePaused = 1, AnimationStateStopped = 2,
                           AnimationTypeOnce = 0, AnimationTypeLoop = 1, AnimationTypePingPong = 2,
                           AnimationDirectionForward = 0, AnimationDirectionBackward = 1, FlipHorizontal = 1,
@@ -145,6 +145,14 @@ V.required = {
         },
         ["ox.misc.anim.CImageObject"] = { "SetImage", "GetImageId", "GetClassType" },
         ["ox.misc.anim.CClipViewObject"] = { "SetClip", "GetClipId", "GetClassType" },
+        ["ox.misc.anim.CPathObject"] = { "IsClosed", "GetLength", "GetPosByCoef", "GetCoefByPos", "GetClassType" },
+
+        ["ox.graphics.CParticleSystem"] = {
+            "IsStopEmit", "IsContinuous", "LoadById", "Reset", "Update", "Render", "GetLifeParticlesCount",
+            "DropOldPos", "IsDead", "GetFlags", "SetFlags", "GetEmission", "SetEmission", "GetEmiterSize",
+            "SetTimer", "SetEmiterSize", "SetLocation",
+            constants = { IsStopEmit = 32768, IsContinuous = 2048 },
+        },
 
         ["ox.gui.IntInsets"] = {}, ["ox.gui.FloatInsets"] = {},
         ["ox.gui.CCursor"] = {}, ["ox.gui.CWidgetManager"] = { "GetKeyboardState" },
@@ -183,16 +191,6 @@ V.controls = {
 }
 
 V.pending = {
-    particles = {
-        classes = {
-            ["ox.graphics.CParticleSystem"] = {
-                "IsStopEmit", "IsContinuous", "LoadById", "Reset", "Update", "Render", "GetLifeParticlesCount",
-                "DropOldPos", "IsDead", "GetFlags", "SetFlags", "GetEmission", "SetEmission", "GetEmiterSize",
-                "SetTimer", "SetEmiterSize", "SetLocation",
-                constants = { IsStopEmit = 32768, IsContinuous = 2048 },
-            },
-        },
-    },
     video = {
         classes = {
             ["ox.graphics.CVideoPlayer"] = { LoadFromFile = 2, "LoadFromFileAlpha", "IsTransparent", "GetWidth",
@@ -203,11 +201,6 @@ V.pending = {
             ["ox.graphics.CTranslucentVideo"] = { "Release", "LoadFromFile", "AttachSound", "GetTexture", "GetWidth",
                                                   "GetHeight", Draw = 2, "Update", "GetDuration", "GetTime", "Pause",
                                                   "Resume", "MoveToTime", "CycleAfterEnd" },
-        },
-    },
-    paths = {
-        classes = {
-            ["ox.misc.anim.CClipObject"] = { "SnapToPath", "SetPath", "GetPath", "Load", "LoadPathHelper" },
         },
     },
     replay = {

@@ -1,11 +1,13 @@
 // oxdump: compiles game data into the binary forms the game reads in place, and shows
 // what a binary dump holds.
+#include "core/ParticlesLoader.h"
 #include "core/TextureDeclarations.h"
 #include "core/TexturesAlpha.h"
 #include "core/TexturesAlphaWriter.h"
 #include "common/LogToStderr.h"
 #include "misc/animation/ClipFormat.h"
 #include "oxdump/Clips.h"
+#include "oxdump/Particles.h"
 #include "oxdump/Quest.h"
 #include "quest/QuestData.h"
 #include "diag/Log.h"
@@ -37,6 +39,7 @@ const char* kUsage =
     "       oxdump texturesalpha <folder|list> <out> [--order auto|rows|columns]\n"
     "                                                    build the alpha-mask table\n"
     "       oxdump clips <clips.xml|folder> <out>        compile the clips\n"
+    "       oxdump particles <particle.xml|folder> <out> compile the particle systems\n"
     "       oxdump quest <quest.xml> <quest.bindump>    compile the quest\n"
     "       oxdump sounds <sounds.xml> <out>             compile the sound declarations\n"
     "       oxdump show <file.bindump>                   print the records of a dump\n"
@@ -85,7 +88,8 @@ const char* kShowHelp =
     "usage: oxdump show <file.bindump>\n"
     "\n"
     "Checks a binary dump as the game would and prints its records: texture declarations\n"
-    "(resources.bindump), alpha masks (texturesalpha.bindump), clips (clips.bindump), sound\n"
+    "(resources.bindump), alpha masks (texturesalpha.bindump), clips (clips.bindump), particle\n"
+    "systems (particles.bindump), sound\n"
     "declarations (sounds.bindump), quests (quest.bindump) and string tables (strings.bindump,\n"
     "strings.xml.bin_utf16le, strings.xml.bin_utf32le).\n";
 
@@ -433,6 +437,8 @@ int Show(int argc, char** argv)
         ok = oxdump::ShowQuest(data, size, path.c_str());
     } else if (magic == ox::misc::anim::kClipsMagic) {
         ok = oxdump::ShowClips(data, size, path.c_str());
+    } else if (magic == ox::core::kParticlesMagic) {
+        ok = oxdump::ShowParticles(data, size, path.c_str());
     } else if (memcmp(data, "S16\x01", 4) == 0 || memcmp(data, "S16L", 4) == 0) {
         CStringTable table;
         if ((ok = table.UseTable(data, size, path.c_str())))
@@ -481,6 +487,7 @@ int main(int argc, char** argv)
         {"resources", Resources, kResourcesHelp},
         {"texturesalpha", TexturesAlpha, kTexturesAlphaHelp},
         {"clips", oxdump::Clips, oxdump::kClipsHelp},
+        {"particles", oxdump::Particles, oxdump::kParticlesHelp},
         {"sounds", Sounds, kSoundsHelp},
         {"quest", oxdump::Quest, oxdump::kQuestHelp},
         {"show", Show, kShowHelp},

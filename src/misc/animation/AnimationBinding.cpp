@@ -46,8 +46,6 @@ void SetFlip(CClipObject& o, unsigned bit, bool on)
     o.SetFlipFlags(on ? (o.GetFlipFlags() | bit) : (o.GetFlipFlags() & ~bit));
 }
 
-// The path names of a clip object (SnapToPath, SetPath, GetPath, Load, LoadPathHelper) come
-// with paths.
 mluabind::i::GenericClass& ClipObjectClass()
 {
     using O = CClipObject;
@@ -91,6 +89,11 @@ mluabind::i::GenericClass& ClipObjectClass()
                     .Method("GetLocation", &O::GetLocation)
                     .Method("IsContains", &O::IsContains)
                     .Method("IsSnapToPath", &O::IsSnapToPath)
+                    .Method("SnapToPath", &O::SnapToPath)
+                    .Method("SetPath", &O::SetPath)
+                    .Method("GetPath", &O::GetPath)
+                    .Method("Load", &O::LoadAgain)
+                    .Method("LoadPathHelper", &O::LoadPathHelper)
                     .Method("SetUserFlags", &O::SetUserFlags)
                     .Method("GetUserFlags", &O::GetUserFlags)
                     .Method("SetVisible", &O::SetVisible)
@@ -128,6 +131,17 @@ void BindAnimation(mluabind::CHost& host)
                       .Method("SetClip", [](CClipViewObject& o, const char* id) { return o.GetClip().Load(id ? id : ""); })
                       .Method("GetClipId", &CClipViewObject::GetClipId)
                       .Method("GetClassType", [](const CClipViewObject&) { return CClipViewObject::GetClassType(); }));
+    anim.AddClass(Class<CPathObject>("CPathObject")
+                      .BaseClass<CClipObject>()
+                      .Method("IsClosed", &CPathObject::IsClosed)
+                      .Method("GetLength", [](const CPathObject& o) { return o.GetCurve().GetLength(); })
+                      .Method("GetPosByCoef", [](const CPathObject& o, float k) { return o.GetCurve().GetPosByCoef(k); })
+                      .Method("GetCoefByPos",
+                              [](const CPathObject& o, const FloatVector& pos) {
+                                  FloatVector offset;
+                                  return o.GetCurve().GetCoefByPos(pos, offset);
+                              })
+                      .Method("GetClassType", [](const CPathObject&) { return CPathObject::GetClassType(); }));
     anim.AddFunction(mluabind::Function("ReloadClips", &ReloadClips));
     host.Bind(mluabind::Namespace("ox").Merge(mluabind::Namespace("misc").Merge(anim)));
 }

@@ -49,6 +49,18 @@ CClip& CClip::operator=(const CClip& other)
         m_Objects.emplace_back(object->Clone());
     for (const auto& path : other.m_Paths)
         m_Paths.emplace_back(static_cast<CPathObject*>(path->Clone()));
+    // The copies follow the copied paths.
+    for (const auto& object : m_Objects) {
+        object->SetClipPaths(&m_Paths);
+        if (const CPathObject* followed = object->GetPath()) {
+            CPathObject* mine = nullptr;
+            for (const auto& path : m_Paths)
+                if (strcmp(path->GetId(), followed->GetId()) == 0)
+                    mine = path.get();
+            OX_ASSERT(mine);
+            object->SetPath(mine);
+        }
+    }
     m_Rect = other.m_Rect;
     m_Id = other.m_Id;
     m_Pos = other.m_Pos;
@@ -102,7 +114,7 @@ bool CClip::Load(const CClipsLoader& loader, const char* id, bool reset, const L
     m_Rect = FloatRect(clip->x, clip->y, clip->w, clip->h);
     LoadBudget ownBudget;
     LoadBudget& budget = parent ? *parent->budget : ownBudget;
-    const LoadContext context {&loader, clip->id.c_str(), parent ? parent->depth + 1 : 0, parent, &budget};
+    const LoadContext context {&loader, clip->id.c_str(), parent ? parent->depth + 1 : 0, parent, &budget, &m_Paths};
     auto spend = [&] {
         if (budget.left > 0) {
             --budget.left;

@@ -2,11 +2,14 @@
 
 #include "diag/Assert.h"
 #include "diag/Log.h"
+#include "misc/animation/ClipObjects.h"
 #include "misc/animation/ClipServices.h"
+#include "misc/animation/ClipsLoader.h"
 
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
+#include <cstring>
 #include <utility>
 
 namespace ox::misc::anim {
@@ -19,12 +22,43 @@ int AppTime() { return static_cast<int>(ClipTimeManager().GetAppTime()); }
 
 int ClampTime(int64_t time) { return static_cast<int>(std::clamp<int64_t>(time, -kMaxClipTime, kMaxClipTime)); }
 
+// A coefficient brought into 0..1: whole turns dropped, a negative one counted from the end.
+float NormaliseCoef(float k)
+{
+    float x = std::fabs(k);
+    if (x > 1.001f)
+        x -= std::floor(x);
+    return k < 0 ? 1 - x : x;
+}
+
+// The coefficient a part `k` of the way from `ka` to `kb`; round a closed path the shorter way.
+float PathCoef(float ka, float kb, float k, bool closed)
+{
+    ka = NormaliseCoef(ka);
+    kb = NormaliseCoef(kb);
+    if (!closed)
+        return ka + (kb - ka) * k;
+    const float forward = kb >= ka && kb < 1.001f ? kb - ka : 1 - ka + kb;
+    const float back = kb >= 0 && ka >= kb ? ka - kb : 1 - kb + ka;
+    return NormaliseCoef(back <= forward ? ka - back * k : ka + forward * k);
+}
+
+CPathObject* FindPath(const PathList* paths, const char* id)
+{
+    if (paths && id)
+        for (const auto& path : *paths)
+            if (strcmp(path->GetId(), id) == 0)
+                return path.get();
+    return nullptr;
+}
+
 } // namespace
 
 CClipObject::CClipObject() : m_StartTime(AppTime()) {}
 
 CClipObject::CClipObject(const CClipObject& other)
-    : m_Base(other.m_Base), m_UserFlags(other.m_UserFlags), m_SoundsDisabled(other.m_SoundsDisabled),
+    : m_Path(other.m_Path), m_ClipPaths(other.m_ClipPaths), m_Base(other.m_Base), m_UserFlags(other.m_UserFlags), m_Snap(other.m_Snap),
+      m_SoundsDisabled(other.m_SoundsDisabled),
       m_Visible(other.m_Visible), m_OwnStates(other.m_OwnStates), m_AnimationState(other.m_AnimationState),
       m_AnimationType(other.m_AnimationType), m_AnimationDirection(other.m_AnimationDirection),
       m_LastInterpolateTime(other.m_LastInterpolateTime), m_States(other.m_States),
@@ -69,7 +103,13 @@ bool CClipObject::LoadFromBase(const ClipObjectBase* base, const LoadContext& co
     m_States = base->KeyStates();
     OX_ASSERT((size_t)m_States % 4 == 0);
     m_Base = base;
-    SetPos(base->pos);
+    m_Snap = base->snap != 0;
+    m_ClipPaths = context.paths;
+    m_Path = base->path.empty() ? nullptr : FindPath(m_ClipPaths, base->path.c_str());
+    if (!base->path.empty() && !m_Path)
+        OX_LOG(kChannel, diag::LogError, "Clip '%s': object '%s' follows the unknown path '%s'; it moves by its key "
+               "states", context.clipId, base->id.c_str(), base->path.c_str());
+    PlacePos(base->pos);
     SetPoly(base->contour);
     SetAngle(base->angle);
     SetColor(base->color);
@@ -84,11 +124,37 @@ bool CClipObject::LoadFromBase(const ClipObjectBase* base, const LoadContext& co
     if (base->anim_type > AnimationTypePingPong || base->anim_dir > AnimationDirectionBackward)
         OX_LOG(kChannel, diag::LogError, "Clip '%s': object '%s' has the animation type %u and direction %u; "
                "once and forward are used", context.clipId, base->id.c_str(), base->anim_type, base->anim_dir);
-    if (!base->path.empty())
-        OX_LOG(kChannel, diag::LogWarning, "Clip '%s': object '%s' follows the path '%s'; paths are not supported "
-               "yet, it moves by its key states", context.clipId, base->id.c_str(), base->path.c_str());
     m_StartTime = AppTime();
     return true;
+}
+
+CPathObject* CClipObject::LoadPathHelper(const char* id) const { return FindPath(m_ClipPaths, id); }
+
+bool CClipObject::LoadAgain()
+{
+    if (!m_Base)
+        return false;
+    LoadBudget budget;
+    const LoadContext context {&CClipsLoader::Instance(), "(reloaded)", 0, nullptr, &budget, m_ClipPaths};
+    return LoadFromBase(m_Base, context);
+}
+
+void CClipObject::PlacePos(const FloatVector& pos)
+{
+    if (!m_Snap || !m_Path) {
+        SetPos(pos);
+        return;
+    }
+    const CPath& path = m_Path->GetCurve();
+    FloatVector offset;
+    SetPos(path.GetPosByCoef(path.GetCoefByPos(pos, offset)));
+}
+
+void CClipObject::SnapToPath(bool snap)
+{
+    m_Snap = snap;
+    if (snap)
+        PlacePos(GetPos());
 }
 
 void CClipObject::ReleaseOwnStates()
@@ -268,6 +334,10 @@ KeyState CClipObject::GetState() const
     state.color = GetColor();
     state.flip = GetFlipFlags();
     state.custom = GetCustomFlags();
+    if (m_Snap && m_Path) {
+        FloatVector offset;
+        state.k = m_Path->GetCurve().GetCoefByPos(GetPos(), offset);
+    }
     return state;
 }
 
@@ -405,6 +475,7 @@ void CClipObject::InterpolateState(float k)
     OX_ASSERT((size_t)m_CurrentPieceAnimation[0] % 4 == 0);
     KeyState& out = m_Interpolated;
     out.pos = a.pos + (b.pos - a.pos) * k;
+    out.k = m_Path ? PathCoef(a.k, b.k, k, m_Path->GetCurve().IsClosed()) : 0.0f;
     out.angle = a.angle + (b.angle - a.angle) * k;
     out.flip = k <= 0.999f ? a.flip : b.flip;
     // A custom flag shows only at the ends of a piece, so that the game can see its edge.
@@ -419,7 +490,10 @@ void CClipObject::InterpolateState(float k)
 
 void CClipObject::ApplyState(const KeyState& state, int keyTime, int baseTime)
 {
-    SetPos(state.pos);
+    if (m_Snap && m_Path)
+        SetPos(m_Path->GetCurve().GetPosByCoef(state.k));
+    else
+        SetPos(state.pos);
     SetPoly(state.contour);
     SetAngle(state.angle);
     SetColor(state.color);

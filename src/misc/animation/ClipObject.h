@@ -7,6 +7,7 @@
 #include "misc/Location.h"
 #include "misc/animation/ClipFormat.h"
 
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -17,6 +18,7 @@ class CRenderer;
 namespace ox::misc::anim {
 
 class CClipsLoader;
+class CPathObject;
 
 enum AnimationType : uint8_t { AnimationTypeOnce = 0, AnimationTypeLoop = 1, AnimationTypePingPong = 2 };
 enum AnimationDirection : uint8_t { AnimationDirectionForward = 0, AnimationDirectionBackward = 1 };
@@ -39,12 +41,16 @@ struct LoadBudget {
 };
 
 // What loading an object needs beside its record.
+using PathList = std::vector<std::unique_ptr<CPathObject>>;
+
 struct LoadContext {
     const CClipsLoader* loader;  // nested clips come from the same bulk
     const char* clipId;          // names the clip in log lines
     int depth;                   // how deep in nested clips this clip is
     const LoadContext* parent;   // the clip this one is nested in, or null
     LoadBudget* budget;          // shared by a clip and everything nested in it
+    // The paths of the clip, which objects follow by id.
+    const PathList* paths = nullptr;
 };
 
 class CClipObject {
@@ -122,7 +128,17 @@ public:
     unsigned GetUserFlags() const { return m_UserFlags; }
     void SetVisible(bool visible) { m_Visible = visible; }
     bool IsVisible() const { return m_Visible; }
-    bool IsSnapToPath() const { return m_Base && m_Base->snap; }
+    // The path the object follows by the coefficient of its keys, or null.
+    void SetPath(CPathObject* path) { m_Path = path; }
+    CPathObject* GetPath() const { return m_Path; }
+    // The path of an id among those of the object's clip, or null.
+    CPathObject* LoadPathHelper(const char* id) const;
+    // Takes the object's record again, with the paths of its clip.
+    bool LoadAgain();
+    void SetClipPaths(const PathList* paths) { m_ClipPaths = paths; }
+    // A snapped object on a path stands on it: at once the nearest point of the path.
+    void SnapToPath(bool snap);
+    bool IsSnapToPath() const { return m_Snap; }
     const char* GetId() const { return m_Base ? m_Base->id.c_str() : ""; }
     const ClipObjectBase* GetBase() const { return m_Base; }
     // The name of a record's object type, as GetType gives it.
@@ -136,6 +152,8 @@ protected:
     // starts), -1 for an interpolated state. `baseTime` is when the key was due, -1 for now.
     void ApplyState(const KeyState& state, int keyTime, int baseTime);
     bool SoundsDisabled() const { return m_SoundsDisabled; }
+    // Sets the position, moved to the nearest point of the path when snapped to one.
+    void PlacePos(const FloatVector& pos);
 
 private:
     // A pass over the keys: its ends, direction, the key at hand and the time it is due.
@@ -154,8 +172,11 @@ private:
     // The keys are usable: at most 126, times strictly rising, one at least (but a path).
     bool CheckKeyStates(const ClipObjectBase& base, const LoadContext& context) const;
 
+    CPathObject* m_Path = nullptr;
+    const PathList* m_ClipPaths = nullptr;
     const ClipObjectBase* m_Base = nullptr;
     unsigned m_UserFlags = 0;
+    bool m_Snap = false;
     bool m_SoundsDisabled = false;
     bool m_Visible = true;
     bool m_OwnStates = false;

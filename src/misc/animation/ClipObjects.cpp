@@ -8,6 +8,7 @@
 #include "misc/animation/ClipServices.h"
 #include "misc/animation/ClipsLoader.h"
 
+#include <algorithm>
 #include <cmath>
 #include <utility>
 
@@ -322,30 +323,156 @@ void CClipViewObject::Stop()
     m_Clip.Stop();
 }
 
-// Kinds not supported yet --------------------------------------------------------------------
+// Particle systems --------------------------------------------------------------------
+
+CParticleObject::CParticleObject(const CParticleObject& other)
+    : CPlacedObject(other), m_System(other.m_System), m_SystemId(other.m_SystemId), m_Scale(other.m_Scale),
+      m_BaseEmission(other.m_BaseEmission), m_BaseEmiterSize(other.m_BaseEmiterSize),
+      m_AdvanceTime(other.m_AdvanceTime), m_FixEmit(other.m_FixEmit), m_ScaleMode(other.m_ScaleMode)
+{
+    if (const core::CTimer* timer = other.m_Timer.Get())
+        m_Timer = timer->Clone(nullptr);
+    m_System.SetTimer(m_Timer.Get());
+}
 
 bool CParticleObject::LoadFromBase(const ClipObjectBase* base, const LoadContext& context)
 {
+    const ParticleExtension& extension = ExtensionOf<ParticleExtension>(base);
+    m_SystemId = extension.system.str();
+    if (!m_System.LoadById(m_SystemId.c_str()))
+        OX_LOG(kChannel, diag::LogError, "Clip '%s': particle object '%s' cannot run the system '%s'; it draws "
+               "nothing", context.clipId, base->id.c_str(), m_SystemId.c_str());
+    if (!m_Timer.Get()) {
+        core::CTimeManager& time = ClipTimeManager();
+        m_Timer = time.AttachTimer(time.GetRoot());
+    }
+    m_System.SetTimer(m_Timer.Get());
+    m_BaseEmission = m_System.GetEmission();
+    m_BaseEmiterSize = m_System.GetEmiterSize();
+    m_FixEmit = extension.fix_emit != 0;
+    m_ScaleMode = extension.scale != 0;
+    m_AdvanceTime = std::clamp(extension.adv_time, 0, 60000);
     if (!CClipObject::LoadFromBase(base, context))
         return false;
-    m_SystemId = ExtensionOf<ParticleExtension>(base).system.str();
-    OX_LOG(kChannel, diag::LogWarning, "Clip '%s': particle object '%s' (system '%s') draws nothing: particle "
-           "systems in clips are not supported yet", context.clipId, base->id.c_str(), m_SystemId.c_str());
+    Restart();
     return true;
 }
+
+void CParticleObject::Reload()
+{
+    const FloatVector location = m_System.GetLocation();
+    if (m_System.LoadById(m_SystemId.c_str()))
+        m_System.SetLocation(location.X, location.Y);
+}
+
+void CParticleObject::Restart()
+{
+    m_System.Reset();
+    m_System.AdvanceTime(m_AdvanceTime, 20);
+}
+
+void CParticleObject::SetPos(const FloatVector& pos)
+{
+    CPlacedObject::SetPos(pos);
+    if (m_FixEmit)
+        m_System.SetLocation(pos.X, pos.Y);
+}
+
+void CParticleObject::SetPoly(const Poly4& poly)
+{
+    CPlacedObject::SetPoly(poly);
+    auto ratio = [](float size, float base) { return std::fabs(base) > 0.0001f ? std::fabs(size) / base : 1.0f; };
+    m_Scale = {ratio(poly[2].X - poly[0].X, m_BaseEmiterSize.X), ratio(poly[2].Y - poly[0].Y, m_BaseEmiterSize.Y)};
+    if (m_ScaleMode || !m_System.IsLoaded())
+        return;
+    if (!m_FixEmit)
+        m_System.SetEmission(m_BaseEmission * m_Scale.X * m_Scale.Y);
+    m_System.SetEmiterSize({m_BaseEmiterSize.X * m_Scale.X, m_BaseEmiterSize.Y * m_Scale.Y});
+}
+
+void CParticleObject::Update()
+{
+    if (m_System.IsLoaded())
+        m_System.Update();
+}
+
+void CParticleObject::Play()
+{
+    CClipObject::Play();
+    m_System.PauseTimer(false);
+}
+
+void CParticleObject::Pause()
+{
+    CClipObject::Pause();
+    m_System.PauseTimer(true);
+}
+
+void CParticleObject::Stop()
+{
+    CClipObject::Stop();
+    for (unsigned i = 0; i < EnumKeyStates(); ++i)
+        if (GetKeyStates()[i].custom & 1)
+            return;
+    Restart();
+}
+
+void CParticleObject::Draw(graphics::CRenderer* renderer)
+{
+    if (!IsVisible() || !m_System.IsLoaded())
+        return;
+    renderer->PushState();
+    if (!(m_Color == graphics::Color()))
+        renderer->SetColor(renderer->GetColor() * m_Color);
+    const float fx = (m_Flip & FlipHorizontal) ? -1.0f : 1.0f, fy = (m_Flip & FlipVertical) ? -1.0f : 1.0f;
+    if (!m_FixEmit || m_Flip & (FlipHorizontal | FlipVertical)) {
+        const FloatVector emitter = m_System.GetLocation();
+        FloatMatrix m = MatrixTranslation(-emitter.X, -emitter.Y);
+        if (m_FixEmit)
+            m = m * MatrixScale(fx, fy);
+        else {
+            m = m * MatrixRotation(m_Location.Angle);
+            if (m_ScaleMode)
+                m = m * MatrixScale(m_Scale.X * fx, m_Scale.Y * fy);
+        }
+        renderer->ApplyMatrix(m * MatrixTranslation(m_Location.Pos.X, m_Location.Pos.Y));
+    }
+    m_System.Render(renderer);
+    renderer->PopState();
+}
+
+// Paths -------------------------------------------------------------------------------------
 
 bool CPathObject::LoadFromBase(const ClipObjectBase* base, const LoadContext& context)
 {
+    m_Curve.Clear();
     if (!CClipObject::LoadFromBase(base, context))
         return false;
-    OX_LOG(kChannel, diag::LogWarning, "Clip '%s': path '%s' draws nothing and leads no object: paths in clips "
-           "are not supported yet", context.clipId, base->id.c_str());
-    return true;
+    m_Curve.SetLocation(m_Location);
+    const PathExtension& extension = ExtensionOf<PathExtension>(base);
+    m_Curve.SetClosed(extension.closed != 0);
+    for (unsigned i = 0; i < extension.points; ++i)
+        m_Curve.AddPoint(extension.Points()[i]);
+    if (m_Curve.GetLength() > 0)
+        return true;
+    OX_LOG(kChannel, diag::LogError, "Clip '%s': path '%s' has no length (%u usable of %u points); it is left out",
+           context.clipId, base->id.c_str(), static_cast<unsigned>(m_Curve.EnumPoints()), extension.points);
+    return false;
 }
 
-bool CPathObject::IsClosed() const
+bool CPathObject::IsContains(const FloatVector& point) const
 {
-    return GetBase() && ExtensionOf<PathExtension>(GetBase()).closed != 0;
+    if (m_Curve.GetSegments().empty())
+        return false;
+    FloatVector offset;
+    m_Curve.GetCoefByPos(point, offset);
+    return offset.X * offset.X + offset.Y * offset.Y <= 9.0f;
+}
+
+void CPathObject::Draw(graphics::CRenderer* renderer)
+{
+    if (IsVisible())
+        m_Curve.Draw(*renderer, graphics::Color(0xFFFFFF00u));
 }
 
 } // namespace ox::misc::anim

@@ -1,9 +1,10 @@
 #pragma once
-// The kinds of clip object: an image, a text, a nested clip; particle systems and paths
-// load their records and draw nothing until they are supported.
+// The kinds of clip object: an image, a text, a nested clip, a particle system and a path.
+#include "graphics/ParticleSystem.h"
 #include "misc/WideChar.h"
 #include "misc/animation/Clip.h"
 #include "misc/animation/ClipObject.h"
+#include "misc/animation/Path.h"
 
 namespace ox::graphics {
 class CTexture;
@@ -154,34 +155,73 @@ private:
     const CClipsLoader* m_Loader = nullptr;
 };
 
-// A particle system of a clip. Particle systems are not supported yet: the object keeps
-// its place and time line and draws nothing.
+// A particle system of a clip, run on a timer of its own. In `fix_emit` mode the emitter
+// moves with the object and the particles stay where they were emitted; otherwise the whole
+// system is drawn turned, scaled and moved with the object.
 class CParticleObject : public CPlacedObject {
 public:
     static const char* GetClassType() { return "particle"; }
 
-    void Draw(graphics::CRenderer*) override {}
+    CParticleObject() = default;
+    CParticleObject(const CParticleObject& other);
+
+    void Draw(graphics::CRenderer* renderer) override;
+    void Update() override;
     std::string GetResourceId() const override { return m_SystemId; }
+    void SetPos(const FloatVector& pos) override;
+    // Sizes the emitter (or, in `scale` mode, the drawing) by the contour's width and height.
+    void SetPoly(const Poly4& poly) override;
+    void Reload() override;
     bool LoadFromBase(const ClipObjectBase* base, const LoadContext& context) override;
     const char* GetType() const override { return GetClassType(); }
     CClipObject* Clone() const override { return new CParticleObject(*this); }
+    void Play() override;
+    void Pause() override;
+    // A key with custom flag 1 keeps the system running; otherwise it starts again.
+    void Stop() override;
+
+    graphics::CParticleSystem& GetSystem() { return m_System; }
+    const graphics::CParticleSystem& GetSystem() const { return m_System; }
 
 private:
+    // Starts the system afresh with its head start.
+    void Restart();
+
+    graphics::CParticleSystem m_System;
+    core::CTimerWrapper m_Timer;
     std::string m_SystemId;
+    FloatVector m_Scale {1, 1};
+    float m_BaseEmission = 0;
+    FloatVector m_BaseEmiterSize;
+    int m_AdvanceTime = 0;
+    bool m_FixEmit = false;
+    bool m_ScaleMode = false;
 };
 
-// A path of a clip. Paths are not supported yet: the object keeps its record and draws
-// nothing, and no object follows it.
+// A path of a clip: its place, contour and angle are those of the curve, which the
+// clip's objects follow by coefficient.
 class CPathObject : public CPlacedObject {
 public:
     static const char* GetClassType() { return "path"; }
 
-    void Draw(graphics::CRenderer*) override {}
+    // The curve when visible, for tools.
+    void Draw(graphics::CRenderer* renderer) override;
     graphics::Color GetColor() const override { return graphics::Color(); }
+    // Within 3 units of the curve.
+    bool IsContains(const FloatVector& point) const override;
+    // A path with no length is logged and refused: nothing could follow it.
     bool LoadFromBase(const ClipObjectBase* base, const LoadContext& context) override;
     const char* GetType() const override { return GetClassType(); }
     CClipObject* Clone() const override { return new CPathObject(*this); }
-    bool IsClosed() const;
+    bool IsClosed() const { return m_Curve.IsClosed(); }
+    CPath& GetCurve() { return m_Curve; }
+    const CPath& GetCurve() const { return m_Curve; }
+
+protected:
+    void OnPlaceChanged() override { m_Curve.SetLocation(m_Location); }
+
+private:
+    CPath m_Curve;
 };
 
 } // namespace ox::misc::anim
