@@ -165,6 +165,9 @@ mluabind::Namespace BindMiniGames()
     mluabind::Namespace ns("kminigames");
     ns.AddClass(cls);
     ns.AddClass(mluabind::IntrusivePtrClass<W>("CMiniGameWidgetPtrT"));
+    // A sender or a found widget as the mini-game it is, or nil.
+    ns.AddFunction(mluabind::Function("CMiniGameWidget.Cast",
+                                      [](gui::CBaseWidget* widget) { return dynamic_cast<W*>(widget); }));
     return ns;
 }
 
