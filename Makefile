@@ -34,7 +34,8 @@ test-asan: deps
 
 run: build
 	@if [ -x $(BUILD_DIR)/src/k17 ]; then \
-		cd games/demo && exec ../../$(BUILD_DIR)/src/k17; \
+		dir=$$(games/demo/stage-run.sh $(abspath $(BUILD_DIR))/tools $(abspath $(BUILD_DIR))/demo-run) && \
+		cd "$$dir" && exec $(abspath $(BUILD_DIR))/src/k17; \
 	else \
 		echo "make run: the game executable k17 is not built yet (the application spine comes next)"; \
 		exit 1; \

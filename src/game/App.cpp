@@ -11,8 +11,10 @@
 #include "game/GameBinding.h"
 #include "game/GameOptions.h"
 #include "game/LoadWindow.h"
+#include "game/MiniGameWidget.h"
 #include "game/Profile.h"
 #include "game/RecordTable.h"
+#include "game/WindowEffects.h"
 #include "gui/Cursor.h"
 #include "gui/GuiServices.h"
 #include "gui/WidgetFactory.h"
@@ -24,6 +26,8 @@
 #include "misc/animation/ClipServices.h"
 #include "misc/animation/ClipsLoader.h"
 #include "misc/sys/Path.h"
+#include "quest/AlphaImageWidget.h"
+#include "quest/Effects.h"
 #include "quest/LuaThreadManager.h"
 #include "quest/QuestBinding.h"
 #include "quest/QuestData.h"
@@ -98,6 +102,7 @@ CApp::~CApp()
     core::CFontManager::Instance().SetTextureLookup(nullptr);
     gui::GetGuiServices().findFont = nullptr;
     gui::GetGuiServices().isSound = nullptr;
+    SetEffectsSettings(nullptr);
     misc::anim::GetClipServices() = misc::anim::ClipServices();
     CloseOutput();
     m_GameFolder.clear();
@@ -136,6 +141,7 @@ void CApp::BindScripts()
     m_Lua->Bind(BindGameClasses());
     m_Lua->Bind(BindGameGlobals());
     m_Lua->Bind(BindDemoShell());
+    m_Lua->Bind(kminigames::BindMiniGames());
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }
@@ -163,10 +169,16 @@ bool CApp::Init()
     for (const char* file : {"properties/constants.xml", "properties/effects.xml", "properties/guitemplates.xml",
                              "properties/gui.xml"})
         m_Settings.LoadXml(file);
+    // Windows open and close with the effects of properties/effects.xml.
+    SetEffectsSettings(&m_Settings.GetChild("Effects"));
+    RegisterWindowEffects();
 
     // The quest's widget kinds, and the scene widget and game cursor serving the quest tree.
     qe::RegisterQuestWidgets(gui::GetWidgetFactory());
     qe::ConnectQuestServices();
+    qe::ConnectEffectsServices();
+    qe::RegisterAlphaImageWidget(gui::GetWidgetFactory());
+    kminigames::RegisterMiniGameWidget(gui::GetWidgetFactory());
     m_Lua = std::make_unique<lua::CLua>("main", true);
     BindScripts();
 
@@ -330,6 +342,7 @@ void CApp::DoUpdate()
     if (m_Lua)
         m_Lua->CheckFileChanges();
     qe::g_LuaThreadManager::Instance().ManageThreads();
+    qe::g_EffectsList::Instance().Update();
     if (m_Demo)
         m_Demo->Update(m_MainTimer.Get() ? m_MainTimer.Get()->GetTime() : 0);
     CApplication::DoUpdate();

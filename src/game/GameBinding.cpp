@@ -4,6 +4,7 @@
 #include "game/GameOptions.h"
 #include "game/Profile.h"
 #include "game/RecordTable.h"
+#include "game/WindowEffects.h"
 #include "lua/Lua.h"
 #include "lua/mluabind/StdBinding.h"
 
@@ -167,12 +168,22 @@ mluabind::Namespace LevelOptionNames()
     return ns;
 }
 
+// The one-shot effects scripts put on widgets.
+mluabind::Namespace EffectNames()
+{
+    mluabind::Namespace ns;
+    ns.AddFunction(mluabind::Function("AddEffectToWidget", &AddEffectToWidget));
+    ns.AddFunction(mluabind::Function("AddRemoveEffectToWidget", &AddRemoveEffectToWidget));
+    return ns;
+}
+
 } // namespace
 
 mluabind::Namespace BindGameClasses()
 {
     mluabind::Namespace ns("k17");
     ns.Merge(ProfileNames()).Merge(OptionsAndRecords());
+    ns.Merge(EffectNames());
     ns.AddFunction(mluabind::Function("misc.CreateGUIDString", &CreateGUIDString));
     return ns;
 }
@@ -197,6 +208,7 @@ void BindGameInto(ox::lua::CLua* lua)
     if (!lua->FindClass(typeid(CGameOptions)))
         ns.AddClass(WithConstants(Class<CGameOptions>("CGameOptions"), kDifficultyConstants));
     ns.Merge(LevelOptionNames());
+    ns.Merge(EffectNames());
     lua->Bind(ns);
     lua->EndBinding();
 }

@@ -11,7 +11,9 @@
 #include "lua/LuaBinding.h"
 #include "lua/mluabind/StdBinding.h"
 #include "misc/animation/ClipObjects.h"
+#include "quest/AlphaImageWidget.h"
 #include "quest/Area.h"
+#include "quest/Effects.h"
 #include "quest/ClipObject.h"
 #include "quest/ImageObject.h"
 #include "quest/GameCursor.h"
@@ -323,6 +325,27 @@ mluabind::Namespace WidgetClasses()
     return ns;
 }
 
+// The effects list with its alpha effect, and the image that takes the mouse on its opaque
+// pixels.
+mluabind::Namespace EffectClasses()
+{
+    mluabind::Namespace ns;
+    ns.AddClass(Class<CBaseEffect>("CBaseEffect").Constructor<>().Method("Update", &CBaseEffect::Update));
+    ns.AddClass(Class<CAlphaEffect>("CAlphaEffect")
+                    .BaseClass<CBaseEffect>()
+                    .Constructor<BaseSceneObjectPtrT, bool, bool, float, const ox::core::CGroupTimer*>());
+    ns.AddClass(mluabind::IntrusivePtrClass<CBaseEffect>("CBaseEffectPtrT"));
+    ns.AddClass(mluabind::IntrusivePtrClass<CAlphaEffect>("CAlphaEffectPtrT"));
+    ns.AddClass(Class<CEffectsList>("CEffectsList")
+                    .Method("AddEffect", &CEffectsList::AddEffect)
+                    .Method("Update", &CEffectsList::Update)
+                    .Method("Clear", &CEffectsList::Clear));
+    ns.AddFunction(mluabind::Function("g_EffectsList.Instance", &g_EffectsList::Instance));
+    ns.AddClass(Class<CAlphaImageWidget>("CAlphaImageWidget").BaseClass<ox::gui::CImageWidget>().Constructor<>());
+    ns.AddClass(mluabind::IntrusivePtrClass<CAlphaImageWidget>("CAlphaImageWidgetPtrT"));
+    return ns;
+}
+
 mluabind::Namespace CursorClass()
 {
     mluabind::Namespace ns;
@@ -408,6 +431,7 @@ mluabind::Namespace BindQuestClasses()
     ns.AddClass(BaseSceneObjectClass());
     ns.Merge(SceneObjectClasses()).Merge(TreeClasses()).Merge(PointersAndWalks()).Merge(Singletons());
     ns.Merge(InventoryClasses()).Merge(WidgetClasses()).Merge(CursorClass()).Merge(TextFunctions());
+    ns.Merge(EffectClasses());
     ns.AddFunction(mluabind::Function("OnClose", &OnClose));
     ns.AddFunction(mluabind::Function("LoadSceneChild_", &LoadSceneChild_));
     ns.AddFunction(mluabind::Function("GetClipTime", &GetClipTime));

@@ -130,3 +130,5 @@ ox.lua.CLua.GetLua("main").LoadScript("scripts/profiles.lua")
 ox.lua.CLua.GetLua("main").LoadScript("scripts/menu.lua")
 -- What the engine offers scripts, walked once loading is complete (after Run).
 ox.lua.CLua.GetLua("main").LoadScript("scripts/engine_tour.lua")
+-- The lamps mini-game, M in the first window.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/minigame.lua")

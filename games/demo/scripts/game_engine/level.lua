@@ -91,6 +91,14 @@ cursor_lua_widget = {
 
 -- The level's rules ----------------------------------------------------------------------------
 
+-- A found thing fades out where it stood: hidden at once, so no click reaches it again, and
+-- drawn while its fade runs.
+local function fade_out(object)
+    object.RaiseObjectFlag(qe.CBaseSceneObject.ObjectFlagHidden)
+    local effect = qe.CAlphaEffect(qe.CBaseSceneObjectPtrT(object), false, false, 600, nil)
+    qe.g_EffectsList.Instance().AddEffect(qe.CBaseEffectPtrT(effect))
+end
+
 -- One of the things to find: off the scene and off the list.
 function find(self)
     local id = text(self.GetId())
@@ -99,7 +107,7 @@ function find(self)
     end
     quest.SetModifyFlag(true)
     local hint = text(cursor().GetHintText())
-    self.RaiseObjectFlag(Removed)
+    fade_out(self)
     -- Its hint goes with it.
     L.level.UpdateFocusedObject(nil)
     L.found[id] = true
