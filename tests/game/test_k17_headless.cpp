@@ -162,7 +162,7 @@ TEST(GameHeadless, RunsFramesAndClosesOnSigterm)
     EXPECT_EQ(log.find("[font]"), std::string::npos) << "the demo's fonts load:\n" << log;
     EXPECT_EQ(log.find("assertion failed"), std::string::npos) << log;
     // The script threads run once per frame: the first builds the level from the quest data.
-    EXPECT_TRUE(run.Output().find("Lantern Demo: level1 built from the quest data: 3 scenes, 18 objects") !=
+    EXPECT_TRUE(run.Output().find("Lantern Demo: level1 built from the quest data: 3 scenes, 19 objects") !=
                 std::string::npos) << run.Output() << log;
     EXPECT_NE(log.find("[quest][1]: Quest data: properties/quest.xml compiled"), std::string::npos) << log;
     // The declared textures are known, and none of them failed to load.
