@@ -3,8 +3,11 @@
 // same events in the same order; the file's bytes, refused files, the feeding times, the
 // cursor following the recording and Ctrl+Alt+P.
 #include "core/Application.h"
+#include "core/ScriptVocabulary.h"
 #include "core/TimeManager.h"
 #include "gui/GuiTestSupport.h"
+#include "lua/Lua.h"
+#include "lua/LuaTestHost.h"
 #include "replay/Replay.h"
 #include "support/FakePlatform.h"
 #include "support/RecordingBackend.h"
@@ -307,4 +310,28 @@ TEST_F(ReplayTest, TheMarksShowOnlyWhileRecordingOrPlaying)
     EXPECT_EQ(drawn(), (std::vector<std::pair<uint32_t, float>> {{0xFF00FF00u, 39.5f}}));
     global.Stop();
     EXPECT_TRUE(drawn().empty());
+}
+
+// A script records and saves through the bound names; the file it writes plays back.
+TEST_F(ReplayTest, ScriptsRecordAndSaveThroughTheirNames)
+{
+    ox::lua::CLua lua {"replay", false};
+    ox::core::BindOX(lua);
+    const std::string code = R"(
+        local record = ox.replay.g_Record.Instance()
+        record.Start()
+        local recording = record.IsRecording()
+        record.Stop()
+        return tostring(recording) .. " " .. tostring(record.SaveEvents("script.rec")) .. " " ..
+               tostring(ox.replay.g_Playback.Instance().LoadEvents("script.rec")) .. " " ..
+               tostring(ox.replay.g_Playback.Instance().IsPlaying()))";
+    CRecord::Instance().OnMouseMove({1, 2}, 0); // not recording: nothing
+    app->GetWidgetManager().SetInputListener(&CRecord::Instance());
+    const size_t before = CRecord::Instance().GetEvents().size();
+    ASSERT_EQ(oxtest::RunChunk(lua.GetLuaState(), "ox.replay.g_Record.Instance().Start()"), "nil");
+    oxtest::SendClick(*platform, 150, 120);
+    EXPECT_EQ(CRecord::Instance().GetEvents().size(), before + 3) << "move, down and up";
+    CRecord::Instance().Stop();
+    EXPECT_EQ(oxtest::RunChunk(lua.GetLuaState(), code), "true true true false");
+    EXPECT_EQ(CPlayback::Instance().GetEvents().size(), before + 3);
 }
