@@ -13,6 +13,7 @@
 #include "misc/StringTable.h"
 #include "misc/Unicode.h"
 #include "misc/sys/Path.h"
+#include "replay/Replay.h"
 
 #include <algorithm>
 #include <chrono>
@@ -77,6 +78,10 @@ CApplication::CApplication()
     gui.isFullscreen = [this] { return m_Renderer.IsFullscreen(); };
     // Windows open and close with declared sounds.
     gui.playSound = [](const std::string& id) { sound::PlaySound(id.c_str()); };
+    // The replay: recording hears live input, playback stands in for it, Ctrl+Alt+P toggles it.
+    m_WidgetManager.SetInputListener(&replay::CRecord::Instance());
+    m_WidgetManager.SetInputBlocked([] { return replay::CPlayback::Instance().IsPlaying(); });
+    m_ReplayKey = &replay::ToggleReplayFile;
 
     // The first use of the string table opens the game pack.
     misc::CStringTable::Instance().Load();
@@ -86,6 +91,9 @@ CApplication::CApplication()
     ReadInt(settings, "debug", m_DebugLevel);
     ReadLocalText(settings, "company", m_Company);
     ReadLocalText(settings, "product", m_Product);
+    // Ctrl+Alt+P checks its playback against "replay.check", or writes it (the drawn frames only;
+    // a game adds its own state).
+    replay::SetReplayFileCheck(misc::WideToUtf8(m_Product), {});
     ReadInt(settings, "version", m_Version);
     ReadWString(settings, "full_version", m_FullVersion);
     ReadLocalText(settings, "window_title", m_WindowTitle);
@@ -213,6 +221,7 @@ void CApplication::Update()
             return;
     }
     m_FrameLimiter.Wait();
+    replay::CPlayback::Instance().Update(m_WidgetManager);
     graphics::SetFrameNumber(graphics::GetFrameNumber() + 1);
     lua::CLua::StepGarbageCollector(g_FrameTime);
     // The widgets see the frame delta of the previous frame; DoUpdate sees the new one.
@@ -238,6 +247,8 @@ void CApplication::Draw()
     if (!m_Renderer.BeginScene())
         return;
     DoDraw(&m_Renderer);
+    replay::CPlayback::Instance().Draw(m_Renderer);
+    replay::CRecord::Instance().Draw(m_Renderer);
     if (IsActive())
         gui::CCursor::Instance().Draw(m_Renderer);
     DrawLetterbox();

@@ -11,6 +11,7 @@
 #include "lua/mluabind/StdBinding.h"
 #include "misc/MiscBinding.h"
 #include "misc/animation/AnimationBinding.h"
+#include "replay/ReplayBinding.h"
 #include "sound/SoundBinding.h"
 
 namespace ox::core {
@@ -42,10 +43,10 @@ void BindLuaStep(mluabind::CHost& host)
 
 using Binder = void (*)(mluabind::CHost&);
 
-// In this order; recording and playback ("replay") join before diag when they exist.
+// In this order.
 constexpr Binder kBinders[] = {
     &BindCore, &graphics::BindGraphics, &BindMiscStep, &BindLuaStep, &gui::BindGuiVocabulary, &sound::BindSound,
-    &diag::BindDiag,
+    &replay::BindReplay, &diag::BindDiag,
 };
 
 } // namespace

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <utility>
 
 namespace ox::gui {
 
@@ -127,6 +128,14 @@ void CWidgetManager::OnWindowMessage(const SystemEvent& event)
 {
     if (m_InputBlocked && m_InputBlocked())
         return;
+    // Restored on the way out, so that a nested loop inside a handler does not leave it unset.
+    IInputListener* const outerListener = std::exchange(m_LiveListener, m_Listener);
+    Translate(event);
+    m_LiveListener = outerListener;
+}
+
+void CWidgetManager::Translate(const SystemEvent& event)
+{
     const IntVector pos = ClientPos(event.lParam);
     const int rawKeyData = static_cast<int>(event.lParam);
     switch (event.message) {
@@ -250,44 +259,60 @@ bool CWidgetManager::MouseEvent(const Call& call)
 
 bool CWidgetManager::OnChar(wchar character, int keys, int rawKeyData)
 {
+    if (m_LiveListener)
+        m_LiveListener->OnChar(character, keys, rawKeyData);
     BaseWindowPtrT window = InputWindow();
     return window && window->OnChar(character, keys, rawKeyData, false);
 }
 
 bool CWidgetManager::OnKeyDown(int key, int keys, int rawKeyData)
 {
+    if (m_LiveListener)
+        m_LiveListener->OnKeyDown(key, keys, rawKeyData);
     BaseWindowPtrT window = InputWindow();
     return window && window->OnKeyDown(key, keys, rawKeyData, false);
 }
 
 bool CWidgetManager::OnKeyUp(int key, int keys, int rawKeyData)
 {
+    if (m_LiveListener)
+        m_LiveListener->OnKeyUp(key, keys, rawKeyData);
     BaseWindowPtrT window = InputWindow();
     return window && window->OnKeyUp(key, keys, rawKeyData, false);
 }
 
 bool CWidgetManager::OnMouseMove(const IntVector& pos, int keys)
 {
+    if (m_LiveListener)
+        m_LiveListener->OnMouseMove(pos, keys);
     return MouseEvent([&](CBaseWindow& w, bool broadcast) { return w.OnMouseMove(pos, keys, broadcast); });
 }
 
 bool CWidgetManager::OnMouseDown(const IntVector& pos, MouseButtons button, int keys)
 {
+    if (m_LiveListener)
+        m_LiveListener->OnMouseDown(pos, button, keys);
     return MouseEvent([&](CBaseWindow& w, bool broadcast) { return w.OnMouseDown(pos, button, keys, broadcast); });
 }
 
 bool CWidgetManager::OnMouseUp(const IntVector& pos, MouseButtons button, int keys)
 {
+    if (m_LiveListener)
+        m_LiveListener->OnMouseUp(pos, button, keys);
     return MouseEvent([&](CBaseWindow& w, bool broadcast) { return w.OnMouseUp(pos, button, keys, broadcast); });
 }
 
 bool CWidgetManager::OnDoubleClick(const IntVector& pos, int keys)
 {
+    if (m_LiveListener)
+        m_LiveListener->OnDoubleClick(pos, keys);
     return MouseEvent([&](CBaseWindow& w, bool broadcast) { return w.OnDoubleClick(pos, keys, broadcast); });
 }
 
 bool CWidgetManager::OnMouseWheel(const IntVector& pos, int delta, int keys)
 {
+    if (m_LiveListener)
+        m_LiveListener->OnMouseWheel(pos, delta, keys);
     return MouseEvent([&](CBaseWindow& w, bool broadcast) { return w.OnMouseWheel(pos, delta, keys, broadcast); });
 }
 

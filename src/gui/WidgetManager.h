@@ -46,6 +46,21 @@ enum KeyCodes : int {
     OX_OEM_2,
 };
 
+// Hears the events that the platform's messages become (a recorder); replayed events, fed
+// to the manager's entries directly, pass it by.
+class IInputListener {
+public:
+    virtual ~IInputListener() = default;
+    virtual void OnChar(wchar character, int keys, int rawKeyData) = 0;
+    virtual void OnKeyDown(int key, int keys, int rawKeyData) = 0;
+    virtual void OnKeyUp(int key, int keys, int rawKeyData) = 0;
+    virtual void OnMouseMove(const misc::IntVector& pos, int keys) = 0;
+    virtual void OnMouseDown(const misc::IntVector& pos, MouseButtons button, int keys) = 0;
+    virtual void OnMouseUp(const misc::IntVector& pos, MouseButtons button, int keys) = 0;
+    virtual void OnDoubleClick(const misc::IntVector& pos, int keys) = 0;
+    virtual void OnMouseWheel(const misc::IntVector& pos, int delta, int keys) = 0;
+};
+
 // The key code of a platform key (a virtual-key code); a key without one gives OX_NONE.
 int TranslateKey(uint32_t virtualKey);
 
@@ -86,6 +101,8 @@ public:
     int GetPressCount() const { return m_PressCount; }
     // While this answers true (a replay plays), messages from the platform are ignored.
     void SetInputBlocked(std::function<bool()> blocked) { m_InputBlocked = std::move(blocked); }
+    // Hears each event made from a platform message, before the window gets it.
+    void SetInputListener(IInputListener* listener) { m_Listener = listener; }
 
     // The events as the main window gets them, in its coordinates: what the messages become,
     // and what a replay feeds. A mouse event makes two calls, a hit-test pass and then a
@@ -106,6 +123,7 @@ private:
     BaseWindowPtrT InputWindow() const;
     template <class Call>
     bool MouseEvent(const Call& call);
+    void Translate(const core::SystemEvent& event);
     void MouseMove(const core::SystemEvent& event);
     void Press();
     void Release();
@@ -118,6 +136,9 @@ private:
     FloatVector m_Scale {1.0f, 1.0f};
     int m_PressCount = 0;
     std::function<bool()> m_InputBlocked;
+    IInputListener* m_Listener = nullptr;
+    // The listener in reach while a platform message is being turned into events.
+    IInputListener* m_LiveListener = nullptr;
 };
 
 } // namespace ox::gui

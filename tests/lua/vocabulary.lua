@@ -13,7 +13,7 @@ local V = {}
 
 V.required = {
     tables = { "ox", "ox.core", "ox.graphics", "ox.gui", "ox.misc", "ox.misc.anim", "ox.lua", "ox.diag",
-               "ox.diag.message", "ox.sound", "std" },
+               "ox.diag.message", "ox.sound", "ox.replay", "std" },
     values = {
         g_OXPlatform = 1, ["ox.core.g_OXPlatform"] = 1,
         ["ox.core.OX_Unknown"] = 0, ["ox.core.OX_Windows"] = 1, ["ox.core.OX_MacOSX"] = 2, ["ox.core.OX_iPhone"] = 3,
@@ -39,6 +39,7 @@ V.required = {
         "ox.misc.anim.ReloadClips",
         "ox.gui.CCursor.Instance", "ox.gui.g_Cursor.Instance",
         "ox.lua.CLua.GetLua", "ox.lua.BindOX",
+        "ox.replay.g_Record.Instance", "ox.replay.g_Playback.Instance",
         "ox.diag.LogW", "ox.diag.LogA", "ox.diag.message.Supress", ["ox.diag.message.ShowW"] = 2,
         ["ox.diag.message.ShowA"] = 2,
         "std.abs", "std.acos", "std.asin", "std.atan", "std.atan2", "std.atof", "std.ceil", "std.cos", "std.cosh",
@@ -160,6 +161,9 @@ V.required = {
         ["ox.gui.CBaseWidget.WidgetIteratorT"] = {}, ["ox.gui.CBaseWidget.ConstWidgetIteratorT"] = {},
         ["ox.gui.CBaseWindow"] = {}, ["ox.gui.CWindow"] = {}, ["ox.gui.CLuaWidget"] = {},
 
+        ["ox.replay.CRecord"] = { "Start", "IsRecording", "Stop", "SaveEvents" },
+        ["ox.replay.CPlayback"] = { "Start", "IsPlaying", "Stop", "LoadEvents" },
+
         ["ox.lua.CLua"] = { "LoadScript", "LoadLuaScripts", Run = 2, "CheckFileChanges", "GetId" },
 
         ["std.string"] = { "c_str", "length", append = 5, constants = { npos = true } },
@@ -201,14 +205,6 @@ V.pending = {
             ["ox.graphics.CTranslucentVideo"] = { "Release", "LoadFromFile", "AttachSound", "GetTexture", "GetWidth",
                                                   "GetHeight", Draw = 2, "Update", "GetDuration", "GetTime", "Pause",
                                                   "Resume", "MoveToTime", "CycleAfterEnd" },
-        },
-    },
-    replay = {
-        tables = { "ox.replay" },
-        functions = { "ox.replay.g_Record.Instance", "ox.replay.g_Playback.Instance" },
-        classes = {
-            ["ox.replay.CRecord"] = { "Start", "IsRecording", "Stop", "SaveEvents" },
-            ["ox.replay.CPlayback"] = { "Start", "IsPlaying", "Stop", "LoadEvents" },
         },
     },
     widgets = {

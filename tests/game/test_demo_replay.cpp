@@ -1,0 +1,180 @@
+// The demo's recorded play-through: games/demo/replay is what the steps below make (this test
+// makes it again and compares; OX_WRITE_DEMO_REPLAY=1 rewrites it), and played back in the
+// real game, headless, in place of live input, it plays the level from the main menu to its end.
+#include "core/platform/StandaloneApplicationSdl.h"
+#include "game/App.h"
+#include "gui/Window.h"
+#include "lua/Lua.h"
+#include "quest/QuestServices.h"
+#include "misc/Unicode.h"
+#include "replay/Replay.h"
+#include "support/TestSupport.h"
+
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <csignal>
+#include <thread>
+
+namespace fs = std::filesystem;
+using namespace ox;
+
+namespace {
+
+struct Step {
+    int x, y;   // canvas position
+    bool click; // else only a move
+};
+
+// The main menu's Play on the canvas, once the menu has come in.
+const misc::IntVector kPlay {512, 112};
+// Events are recorded in the main window's coordinates: the first window stands here.
+const misc::IntVector kMainOrigin {40, 430};
+
+// The level, as tests/game/test_level_playthrough.cpp plays it with the mouse.
+const Step kSteps[] = {
+    {150, 530, false}, {150, 530, true}, {300, 470, true}, {620, 380, true}, {90, 330, true},
+    {720, 545, true},  {500, 100, true}, {915, 400, true}, {200, 218, true}, {420, 218, true},
+    {560, 530, true},  {820, 500, true}, {917, 683, true}, {820, 500, true}, {820, 500, true},
+    {422, 310, true},  {422, 296, true}, {602, 300, true}, {723, 177, true}, {512, 290, true},
+};
+
+// The recording, made on a clock of our own: Play at 100 ms, the level's steps from 1.5 s on.
+bool MakeRecording(const fs::path& path)
+{
+    oxtest::FakeClock clock;
+    replay::CRecord record(clock.Ticks());
+    record.Start();
+    auto at = [&](misc::IntVector canvas, bool click) {
+        const misc::IntVector pos(canvas.X - kMainOrigin.X, canvas.Y - kMainOrigin.Y);
+        record.OnMouseMove(pos, 0);
+        if (click) {
+            record.OnMouseDown(pos, gui::LeftButton, 0);
+            record.OnMouseUp(pos, gui::LeftButton, 0);
+        }
+    };
+    clock.Set(100);
+    at(kPlay, true);
+    clock.Set(1500);
+    for (const Step& step : kSteps) {
+        at({step.x, step.y}, step.click);
+        clock.Advance(step.click ? 400 : 300);
+    }
+    record.Stop();
+    return record.SaveEvents(misc::Utf8ToWide(path.string()).c_str());
+}
+
+// The game in this process: to the main menu, then the file "replay" by the replay key's
+// action. Exit codes above 0 say where it went wrong.
+int PlayTheRecording()
+{
+    k17::CApp app;
+    app.ReadGameFolder();
+    if (!app.Init())
+        return 10;
+    gui::BaseWindowPtrT loading = app.CreateLoadWindow();
+    app.SetMainWindow(loading);
+    auto* adapter = dynamic_cast<core::CStandaloneApplicationSdl*>(app.GetSystemIntegration());
+    if (!adapter)
+        return 11;
+    auto frame = [&] {
+        adapter->PumpMessages();
+        app.Update();
+        app.Draw();
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    };
+    // The main menu, come to rest, with no click script of the level running.
+    misc::FloatVector centre, last {-1, -1};
+    for (int i = 0, still = 0; i < 1000 && still < 10; ++i) {
+        frame();
+        gui::CBaseWindow* menu = app.GetTopWindow();
+        gui::CWidget* play = menu && menu->GetId() == "main_menu" ? menu->GetWidget("play", true) : nullptr;
+        lua::CLua* level = qe::GetLevelLua();
+        if (!play || (level && lua::CallLuaFunction<bool>(level, "IsClikThread")))
+            continue;
+        centre = play->GetAbsPos(false) + misc::FloatVector(play->GetSize().X / 2, play->GetSize().Y / 2);
+        for (gui::CBaseWindow* window = menu; window; window = window->GetParentWindow())
+            centre += window->GetOffset();
+        still = centre == last ? still + 1 : 0;
+        last = centre;
+    }
+    if (!(centre == last)) {
+        printf("no main menu at rest\n");
+        return 12;
+    }
+    const misc::IntVector origin = app.GetMainWindow()->AdaptPos({0, 0});
+    if (static_cast<int>(centre.X) != kPlay.X || static_cast<int>(centre.Y) != kPlay.Y ||
+        origin.X != -kMainOrigin.X || origin.Y != -kMainOrigin.Y) {
+        printf("Play is at %g,%g now, the first window at %d,%d: change kPlay or kMainOrigin and rewrite the "
+               "recording\n", centre.X, centre.Y, -origin.X, -origin.Y);
+        return 13;
+    }
+    replay::ToggleReplayFile();
+    for (int i = 0; i < 4000 && replay::CPlayback::Instance().IsPlaying(); ++i)
+        frame(); // the level window runs its frames inside one of these
+    for (int i = 0; i < 20; ++i)
+        frame();
+    app.Stop();
+    loading.reset();
+    app.DoShutdown();
+    return 0;
+}
+
+} // namespace
+
+TEST(DemoReplay, TheRecordingIsWhatThePlayThroughsStepsMake)
+{
+    const fs::path kept = fs::path(OX_DEMO_GAME) / "replay";
+    if (getenv("OX_WRITE_DEMO_REPLAY")) {
+        ASSERT_TRUE(MakeRecording(kept));
+    }
+    oxtest::TempDir dir;
+    ASSERT_TRUE(MakeRecording(dir / "replay"));
+    EXPECT_EQ(oxtest::ReadFile(dir / "replay"), oxtest::ReadFile(kept))
+        << "games/demo/replay differs from what this test makes: run it with OX_WRITE_DEMO_REPLAY=1";
+}
+
+TEST(DemoReplay, TheRecordedPlayThroughFinishesTheLevelHeadless)
+{
+    oxtest::TempDir dir;
+    const fs::path game = dir / "demo";
+    fs::copy(OX_DEMO_GAME, game, fs::copy_options::recursive);
+    fs::remove(game / "replay.check");
+    fs::create_directories(dir / "xdg");
+    const pid_t pid = fork();
+    if (pid == 0) {
+        signal(SIGALRM, [](int) {
+            fflush(stdout);
+            _exit(99);
+        });
+        alarm(90);
+        setenv("XDG_DATA_HOME", (dir / "xdg").c_str(), 1);
+        setenv("SDL_VIDEODRIVER", "offscreen", 1);
+        setenv("ALSOFT_DRIVERS", "null", 1);
+        if (chdir(game.c_str()) != 0)
+            _exit(101);
+        const int result = PlayTheRecording();
+        fflush(stdout);
+        _exit(result);
+    }
+    int status = 0;
+    ASSERT_EQ(waitpid(pid, &status, 0), pid);
+    const std::string output = oxtest::ReadFile(game / "k17_stdout.txt");
+    const std::string errors = oxtest::ReadFile(game / "k17_stderr.txt");
+    ASSERT_TRUE(WIFEXITED(status)) << "signal " << WTERMSIG(status) << "\n" << output << errors;
+    ASSERT_EQ(WEXITSTATUS(status), 0) << output << errors;
+    size_t at = 0;
+    for (const char* line :
+         {"Lantern Demo: the scene garden", "Lantern Demo: found coin (1/9)", "Lantern Demo: the key opens the chest",
+          "Lantern Demo: found gem (9/9)", "Lantern Demo: the level is complete",
+          "Lantern Demo: the level window closes", "Menu: \"main_menu\" opens"}) {
+        const size_t found = output.find(line, at);
+        ASSERT_NE(found, std::string::npos) << "missing after offset " << at << ": " << line << "\n" << output;
+        at = found + 1;
+    }
+    EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
+    // The first playback wrote the check file of the recording.
+    const std::string check = oxtest::ReadFile(game / "replay.check");
+    EXPECT_EQ(check.rfind("oxreplaycheck 1\ngame Lantern Demo\nevents ", 0), 0u) << check;
+}
