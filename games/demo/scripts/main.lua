@@ -130,3 +130,5 @@ ox.lua.CLua.GetLua("main").LoadScript("scripts/profiles.lua")
 ox.lua.CLua.GetLua("main").LoadScript("scripts/menu.lua")
 -- What the engine offers scripts, walked once loading is complete (after Run).
 ox.lua.CLua.GetLua("main").LoadScript("scripts/engine_tour.lua")
+-- Achievements: awarded in the level, shown from the main menu.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/achievements.lua")
