@@ -72,12 +72,15 @@ TEST(DemoAchievements, EarnedInTheLevelKeptOverARestartShownFromTheMenu)
               "ok found 11");
     EXPECT_NE(demo.Output().find("Lantern Demo: achievement first_find earned, number 1"), std::string::npos);
 
-    // A new run: Ann keeps it, Bob has nothing, and the window shows Ann's.
+    // A new run: Ann keeps it, Bob has nothing, and the main menu's Achievements opens the
+    // window with Ann's.
     EXPECT_EQ(run("return k17.g_Achievements.Instance().GetScore()",
                   "local pm, a = k17.g_ProfileManager.Instance(), k17.g_Achievements.Instance()"
                   " pm.CreateProfile('Bob', true) local bob = a.GetScore() .. a.GetCompletion('first_find')"
                   " pm.SetCurrentProfile('Ann')"
-                  " local w = Menu.Make('achievements') AchievementsWnd.Show(w)"
+                  " local menu = g_Application.GetTopWindow()"
+                  " MainMenu.OnChildAction(menu, 'pressed', menu.GetWidget('achievements', true))"
+                  " local w = g_Application.GetTopWindow()"
                   " local function t(id) return ox.gui.CLabelWidget.Cast(w.GetWidget(id, true)).GetText().c_str() end"
                   " return bob .. '|' .. t('ach1_title') .. '|' .. t('ach1_state') .. '|' .. t('ach2_state') .. '|' .. t('ach_score')"),
               "ok 10 00|First find: Find one thing in the garden|Earned, number 1|0 of 9|Score: 10");
