@@ -1,10 +1,14 @@
 #include "game/GameBinding.h"
 
 #include "diag/Assert.h"
+#include "game/Achievements.h"
 #include "game/GameOptions.h"
 #include "game/Profile.h"
 #include "game/RecordTable.h"
 #include "game/WindowEffects.h"
+#include "game/ScriptHelpers.h"
+#include "graphics/Renderer.h"
+#include "misc/animation/Clip.h"
 #include "lua/Lua.h"
 #include "lua/mluabind/StdBinding.h"
 
@@ -177,6 +181,28 @@ mluabind::Namespace EffectNames()
     return ns;
 }
 
+// The achievements of the current profile, and their definitions for a window to show.
+mluabind::Namespace AchievementNames()
+{
+    using A = CAchievements;
+    mluabind::Namespace ns;
+    ns.AddClass(Class<A>("CAchievements")
+                    .Method("AddProgress", &A::AddProgressToCurrent)
+                    .Method("GetProgress", &A::GetProgress)
+                    .Method("GetCompletion", &A::GetCompletion)
+                    .Method("GetScore", &A::GetScore)
+                    .Method("GetCount", &A::GetCount)
+                    .Method("GetId", &A::GetId)
+                    .Method("GetMaxProgress", &A::GetMaxProgress)
+                    .Method("GetShowProgressStep", &A::GetShowProgressStep)
+                    .Method("GetTitle", &A::GetTitle)
+                    .Method("GetDescription", &A::GetDescription)
+                    .Method("GetImage", &A::GetImage)
+                    .Method("Save", static_cast<bool (A::*)() const>(&A::Save)));
+    ns.AddFunction(mluabind::Function("g_Achievements.Instance", &g_Achievements::Instance));
+    return ns;
+}
+
 } // namespace
 
 mluabind::Namespace BindGameClasses()
@@ -184,7 +210,10 @@ mluabind::Namespace BindGameClasses()
     mluabind::Namespace ns("k17");
     ns.Merge(ProfileNames()).Merge(OptionsAndRecords());
     ns.Merge(EffectNames());
+    ns.Merge(AchievementNames());
+    ns.AddFunction(mluabind::Function("CharToInt", &CharToInt));
     ns.AddFunction(mluabind::Function("misc.CreateGUIDString", &CreateGUIDString));
+    ns.AddFunction(mluabind::Function("misc.ExecuteFile", &ExecuteFile));
     return ns;
 }
 
@@ -209,6 +238,11 @@ void BindGameInto(ox::lua::CLua* lua)
         ns.AddClass(WithConstants(Class<CGameOptions>("CGameOptions"), kDifficultyConstants));
     ns.Merge(LevelOptionNames());
     ns.Merge(EffectNames());
+    // The level's rules award achievements.
+    if (!lua->FindClass(typeid(CAchievements)))
+        ns.Merge(AchievementNames());
+    ns.AddFunction(mluabind::Function("misc.RenderBorderedClip", &RenderBorderedClip));
+    ns.AddFunction(mluabind::Function("misc.GetString", &GetString));
     lua->Bind(ns);
     lua->EndBinding();
 }

@@ -5,73 +5,15 @@
 #include "lua/Lua.h"
 #include "lua/LuaTestHost.h"
 #include "support/TestSupport.h"
+#include "support/VocabularyWalk.h"
 
 #include <iostream>
 
 using ox::lua::CLua;
-using mluabind::i::GenericClass;
 
 namespace {
 
-mluabind::CHost* ProbeHost(lua_State* L) { return static_cast<mluabind::CHost*>(lua_touserdata(L, lua_upvalueindex(1))); }
-
-// The overloads of a method as a script finds it: the class's own, else the first base's.
-int CountMethods(mluabind::CHost& host, GenericClass* cls, const char* name)
-{
-    auto [first, last] = cls->FindMethodRun(name);
-    if (first != last)
-        return static_cast<int>(last - first);
-    for (auto& [type, adapter] : cls->m_Adapters)
-        if (GenericClass* base = adapter->GetTargetGenericClass(host))
-            if (int count = CountMethods(host, base, name))
-                return count;
-    return 0;
-}
-
-bool HasMember(mluabind::CHost& host, GenericClass* cls, const char* name)
-{
-    if (cls->FindOwnMember(name))
-        return true;
-    for (auto& [type, adapter] : cls->m_Adapters)
-        if (GenericClass* base = adapter->GetTargetGenericClass(host); base && HasMember(host, base, name))
-            return true;
-    return false;
-}
-
-int ProbeClass(lua_State* L)
-{
-    lua_pushboolean(L, ProbeHost(L)->FindClassByName(luaL_checkstring(L, 1)) != nullptr);
-    return 1;
-}
-
-int ProbeFunctions(lua_State* L)
-{
-    const auto* overloads = ProbeHost(L)->FindFunctions(luaL_checkstring(L, 1));
-    lua_pushnumber(L, overloads ? static_cast<double>(overloads->size()) : 0);
-    return 1;
-}
-
-int ProbeMethods(lua_State* L)
-{
-    mluabind::CHost& host = *ProbeHost(L);
-    GenericClass* cls = host.FindClassByName(luaL_checkstring(L, 1));
-    lua_pushnumber(L, cls ? CountMethods(host, cls, luaL_checkstring(L, 2)) : 0);
-    return 1;
-}
-
-int ProbeMember(lua_State* L)
-{
-    mluabind::CHost& host = *ProbeHost(L);
-    GenericClass* cls = host.FindClassByName(luaL_checkstring(L, 1));
-    lua_pushboolean(L, cls && HasMember(host, cls, luaL_checkstring(L, 2)));
-    return 1;
-}
-
-struct GroupResult {
-    int wanted = 0;
-    int found = 0;
-    std::string problems;
-};
+using oxtest::GroupResult;
 
 struct VocabularyTest : ::testing::Test {
     oxtest::TempDir dir;
@@ -86,29 +28,7 @@ struct VocabularyTest : ::testing::Test {
     // "pending.video", ...) in the given host.
     static GroupResult Walk(mluabind::CHost& host, const std::string& group)
     {
-        lua_State* L = host.GetLuaState();
-        EXPECT_EQ(luaL_dofile(L, OX_VOCABULARY_LUA), 0) << lua_tostring(L, -1);
-        lua_setglobal(L, "vocabulary");
-        lua_newtable(L);
-        const std::pair<const char*, lua_CFunction> probes[] = {
-            {"class", &ProbeClass}, {"functions", &ProbeFunctions}, {"methods", &ProbeMethods}, {"member", &ProbeMember}};
-        for (auto [name, function] : probes) {
-            lua_pushlightuserdata(L, &host);
-            lua_pushcclosure(L, function, 1);
-            lua_setfield(L, -2, name);
-        }
-        lua_setglobal(L, "probe");
-        GroupResult result;
-        std::string code = "local w, f, p = vocabulary.walk(vocabulary." + group + ", probe) return w .. '|' .. f .. '|' .. p";
-        std::string text = oxtest::RunChunk(L, code);
-        size_t a = text.find('|'), b = text.find('|', a + 1);
-        EXPECT_NE(b, std::string::npos) << text;
-        if (b == std::string::npos)
-            return result;
-        result.wanted = std::stoi(text.substr(0, a));
-        result.found = std::stoi(text.substr(a + 1, b - a - 1));
-        result.problems = text.substr(b + 1);
-        return result;
+        return oxtest::WalkVocabulary(host, OX_VOCABULARY_LUA, OX_VOCABULARY_LUA, group);
     }
 
     std::string Run(const std::string& code) { return oxtest::RunChunk(lua.GetLuaState(), code); }

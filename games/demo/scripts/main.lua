@@ -132,3 +132,5 @@ ox.lua.CLua.GetLua("main").LoadScript("scripts/menu.lua")
 ox.lua.CLua.GetLua("main").LoadScript("scripts/engine_tour.lua")
 -- The lamps mini-game, M in the first window.
 ox.lua.CLua.GetLua("main").LoadScript("scripts/minigame.lua")
+-- Achievements: awarded in the level, shown from the main menu.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/achievements.lua")

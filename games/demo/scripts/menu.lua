@@ -61,6 +61,8 @@ function Menu.Open(parent, id)
     end
     if id == "options" then
         OptionsWindow.Show(window)
+    elseif id == "achievements" and AchievementsWnd then
+        AchievementsWnd.Show(window)
     elseif id == "main_menu" then
         -- The buttons of windows the game doesn't have are disabled.
         for _, other in ipairs({ "profiles", "records" }) do
@@ -169,7 +171,7 @@ function MainMenu.OnChildAction(self, action, sender)
         Profiles.OpenChooser()
     elseif id == "records" and Profiles then
         Profiles.OpenRecords()
-    elseif id == "options" or id == "profiles" or id == "records" then
+    elseif id == "options" or id == "profiles" or id == "records" or id == "achievements" then
         Menu.Open(self, id)
     elseif id == "quit" then
         g_Application.Stop()

@@ -99,6 +99,21 @@ local function fade_out(object)
     qe.g_EffectsList.Instance().AddEffect(qe.CBaseEffectPtrT(effect))
 end
 
+-- One step towards an achievement of the current player, if there is one
+-- (properties/achievements.xml); the game's store reaches this host through __QEBindGame
+-- (scripts/achievements.lua).
+local function award(id)
+    if not (k17 and k17.g_Achievements and k17.g_ProfileManager.Instance().GetCurrentProfile()) then
+        return
+    end
+    local store = k17.g_Achievements.Instance()
+    local before = store.GetCompletion(id)
+    local place = store.AddProgress(id, 1)
+    if place > 0 and before == 0 then
+        print("Lantern Demo: achievement " .. id .. " earned, number " .. place)
+    end
+end
+
 -- One of the things to find: off the scene and off the list.
 function find(self)
     local id = text(self.GetId())
@@ -118,6 +133,8 @@ function find(self)
     end
     sound("found")
     print(string.format("Lantern Demo: found %s (%d/%d), hint \"%s\"", id, L.count, #L.to_find, hint))
+    award("first_find")
+    award("sharp_eyes")
     L.level.RunLevelScript()
 end
 
@@ -178,6 +195,7 @@ function use_chest(self)
         cursor().ClearCursor(false)
         sound("found")
         print("Lantern Demo: the key opens the chest")
+        award("chest_opened")
     else
         print("Lantern Demo: the chest is locked")
     end
