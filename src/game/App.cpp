@@ -136,12 +136,18 @@ void CApp::CloseOutput()
 // The framework's script vocabulary, then the game's and the quest tree.
 void CApp::BindScripts()
 {
+    // A level's host gets the mini-games too, from qe.StartLevel.
+    qe::SetLevelBinder([main = m_Lua.get()](lua::CLua& level) {
+        level.BeginBinding();
+        level.Bind(kminigames::BindMiniGames(main));
+        level.EndBinding();
+    });
     core::BindOX(*m_Lua);
     m_Lua->BeginBinding();
     m_Lua->Bind(BindGameClasses());
     m_Lua->Bind(BindGameGlobals());
     m_Lua->Bind(BindDemoShell());
-    m_Lua->Bind(kminigames::BindMiniGames());
+    m_Lua->Bind(kminigames::BindMiniGames(m_Lua.get()));
     m_Lua->Bind(qe::BindQuestClasses());
     m_Lua->EndBinding();
 }

@@ -148,7 +148,7 @@ void AddAllSlotAccessors(mluabind::i::CCl<CMiniGameWidget>& cls, std::index_sequ
 
 } // namespace
 
-mluabind::Namespace BindMiniGames()
+mluabind::Namespace BindMiniGames(ox::lua::CLua* mainLua)
 {
     using W = CMiniGameWidget;
     auto& cls = mluabind::Class<W>("CMiniGameWidget")
@@ -164,6 +164,7 @@ mluabind::Namespace BindMiniGames()
     AddAllSlotAccessors(cls, std::make_index_sequence<std::size(kSlotNames)>());
     mluabind::Namespace ns("kminigames");
     ns.AddClass(cls);
+    ns.AddConstant(mluabind::Constant("g_MainLua", mainLua));
     ns.AddClass(mluabind::IntrusivePtrClass<W>("CMiniGameWidgetPtrT"));
     // A sender or a found widget as the mini-game it is, or nil.
     ns.AddFunction(mluabind::Function("CMiniGameWidget.Cast",

@@ -79,7 +79,7 @@ private:
 
 // Enters the widget under minigame_widget.
 void RegisterMiniGameWidget(ox::gui::CWidgetFactory& factory);
-// The namespace kminigames for a script host.
-mluabind::Namespace BindMiniGames();
+// The namespace kminigames for a script host; g_MainLua is `mainLua`, the game's main host.
+mluabind::Namespace BindMiniGames(ox::lua::CLua* mainLua);
 
 } // namespace kminigames

@@ -464,6 +464,16 @@ void BindMissingGeometry(mluabind::CHost& host)
     host.EndBinding();
 }
 
+namespace {
+std::function<void(ox::lua::CLua&)>& LevelBinder()
+{
+    static std::function<void(ox::lua::CLua&)> binder;
+    return binder;
+}
+} // namespace
+
+void SetLevelBinder(std::function<void(ox::lua::CLua&)> binder) { LevelBinder() = std::move(binder); }
+
 int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, const std::string& a,
                const ox::core::CSettings* settings, const std::string& initScript, const ox::wstring& b,
                const std::string& c, bool d)
@@ -476,6 +486,8 @@ int StartLevel(ox::lua::CLua* lua, ox::gui::CWindow* window, CLevel* level, cons
     lua->BeginBinding();
     lua->Bind(BindQuestClasses());
     lua->EndBinding();
+    if (LevelBinder())
+        LevelBinder()(*lua);
     lua->Run("__g_InitScript = function () " + initScript + " end");
     lua->LoadScript("scripts/game_engine/quest.lua");
     return ox::lua::CallLuaFunction<int>(lua, "quest.StartLevel", window, level, a, settings, b, c, d);

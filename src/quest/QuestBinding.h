@@ -5,6 +5,7 @@
 #include "lua/mluabind/Binding.h"
 #include "misc/WideChar.h"
 
+#include <functional>
 #include <string>
 
 namespace ox::core {
@@ -41,8 +42,12 @@ void BindFramework(mluabind::CHost& host);
 // for a host whose framework vocabulary lacks them.
 void BindMissingGeometry(mluabind::CHost& host);
 
+// What a level's host gets beside "qe" from StartLevel (the game gives its mini-games'
+// vocabulary); none by default.
+void SetLevelBinder(std::function<void(ox::lua::CLua&)> binder);
+
 // Starts a level in its Lua host (the one listed as qe_level): binds the framework's
-// vocabulary when the host lacks it, then "qe"; defines the global __g_InitScript as a
+// vocabulary when the host lacks it, then "qe" and what the level binder adds; defines the global __g_InitScript as a
 // function with `initScript` as its body; loads scripts/game_engine/quest.lua; and returns
 // what quest.StartLevel(window, level, a, settings, b, c, d) returns. `a` to `d` belong to
 // the game's scripts and are only passed on. A failure is reported by the host; a

@@ -72,28 +72,29 @@ V.achievements = {
     },
 }
 
+V.window_effects = {
+    functions = { "k17.AddEffectToWidget", "k17.AddRemoveEffectToWidget" },
+}
+
 V.pending = {
     font_viewer = {
         classes = { ["k17.CFontViewerWindow"] = {} },
     },
-    window_effects = {
-        functions = { "k17.AddEffectToWidget", "k17.AddRemoveEffectToWidget" },
-    },
-    minigames = {
-        tables = { "kminigames" },
-        values = { ["kminigames.g_MainLua"] = true },
-        classes = {
-            ["kminigames.CMiniGameWidget"] = {
-                "SetOnCharScriptName", "GetOnCharScriptName", "SetOnKeyDownScriptName", "GetOnKeyDownScriptName",
-                "SetOnKeyUpScriptName", "GetOnKeyUpScriptName", "SetOnMouseMoveScriptName", "GetOnMouseMoveScriptName",
-                "SetOnMouseDownScriptName", "GetOnMouseDownScriptName", "SetOnMouseUpScriptName",
-                "GetOnMouseUpScriptName", "SetOnDoubleClickScriptName", "GetOnDoubleClickScriptName",
-                "SetOnMouseWheelScriptName", "GetOnMouseWheelScriptName", "SetOnUpdateScriptName",
-                "GetOnUpdateScriptName", "SetGroupScriptName", "GetGroupScriptName", "SetOnPreferredSizeScriptName",
-                "GetOnPreferredSizeScriptName", "SetOnChildActionScriptName", "GetOnChildActionScriptName",
-                "SetGameResult", "GetGameResult", "SetOnLoadScriptName", "GetOnLoadScriptName", "OnEndGame",
-                "GetPreferredSize", "OnMouseMove",
-            },
+}
+
+V.minigames = {
+    tables = { "kminigames" }, -- and kminigames.g_MainLua, the main host (checked by the test)
+    classes = {
+        ["kminigames.CMiniGameWidget"] = {
+            "SetOnCharScriptName", "GetOnCharScriptName", "SetOnKeyDownScriptName", "GetOnKeyDownScriptName",
+            "SetOnKeyUpScriptName", "GetOnKeyUpScriptName", "SetOnMouseMoveScriptName", "GetOnMouseMoveScriptName",
+            "SetOnMouseDownScriptName", "GetOnMouseDownScriptName", "SetOnMouseUpScriptName",
+            "GetOnMouseUpScriptName", "SetOnDoubleClickScriptName", "GetOnDoubleClickScriptName",
+            "SetOnMouseWheelScriptName", "GetOnMouseWheelScriptName", "SetOnUpdateScriptName",
+            "GetOnUpdateScriptName", "SetGroupScriptName", "GetGroupScriptName", "SetOnPreferredSizeScriptName",
+            "GetOnPreferredSizeScriptName", "SetOnChildActionScriptName", "GetOnChildActionScriptName",
+            "SetGameResult", "GetGameResult", "SetOnLoadScriptName", "GetOnLoadScriptName", "OnEndGame",
+            "GetPreferredSize", "OnMouseMove",
         },
     },
 }

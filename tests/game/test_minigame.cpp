@@ -31,7 +31,7 @@ TEST(MiniGame, EventsReachTheGroupsFunctionsAndTheResultTheParent)
     lua::CLua lua("test_minigame", false);
     qe::BindFramework(lua);
     lua.BeginBinding();
-    lua.Bind(kminigames::BindMiniGames());
+    lua.Bind(kminigames::BindMiniGames(&lua));
     lua.EndBinding();
     ASSERT_EQ(oxtest::RunChunk(lua.GetLuaState(), R"(
         log = {}
