@@ -34,9 +34,14 @@ FloatVector Direction(const FloatVector& v)
     return {v.X * k, v.Y * k};
 }
 
-uint8_t Channel(float value) { return value >= 255 ? 255 : value <= 0 ? 0 : static_cast<uint8_t>(value); }
+// Extreme but finite records can make a value NaN on the way (infinity less infinity): it
+// counts as 0 rather than reaching a conversion that is undefined for it.
+uint8_t Channel(float value) { return value >= 255 ? 255 : value > 0 ? static_cast<uint8_t>(value) : 0; }
 
-int16_t Coordinate(float value) { return static_cast<int16_t>(std::clamp(value, -32768.0f, 32767.0f)); }
+int16_t Coordinate(float value)
+{
+    return std::isnan(value) ? 0 : static_cast<int16_t>(std::clamp(value, -32768.0f, 32767.0f));
+}
 
 // Every number of a record that is read as a float is finite.
 bool IsFinite(const ParticleDesc& d)

@@ -346,3 +346,43 @@ TEST(ParticleTable, BadDumpsAndRecordsAreRefused)
     EXPECT_FALSE(again.IsBuiltFromXml());
     EXPECT_NE(again.Find("x"), nullptr);
 }
+
+// A fuzzer's finding: a record of finite but extreme numbers whose particles reach NaN on the
+// way. Nothing converts a NaN to an integer (undefined; the sanitizer build of the tests stops
+// there), and the systems still run and draw.
+TEST(ParticleRender, ExtremeRecordsDrawOnlyNumbers)
+{
+    std::string bytes = oxtest::ReadFile(OX_FUZZ_CORPUS "/fuzz_particles/nan-coordinate");
+    ASSERT_GE(bytes.size(), 8u + sizeof(ox::core::ParticleDesc));
+    const uint32_t header[2] = {ox::core::kParticlesMagic,
+                                static_cast<uint32_t>((bytes.size() - 8) / sizeof(ox::core::ParticleDesc))};
+    memcpy(bytes.data(), header, sizeof header);
+    bytes.resize(8 + header[1] * sizeof(ox::core::ParticleDesc));
+    std::vector<uint32_t> aligned((bytes.size() + 3) / 4);
+    memcpy(aligned.data(), bytes.data(), bytes.size());
+    ox::core::CParticlesLoader loader;
+    ASSERT_TRUE(loader.LoadFromMemory(aligned.data(), bytes.size(), "nan-coordinate"));
+
+    oxtest::RecordingBackend* backend = nullptr;
+    auto renderer = oxtest::MakeRecordingRenderer(backend, 1024, 768, 1024, 768);
+    CSurface surface {4, 4};
+    CTexture texture {&surface};
+    CParticleSystem::SetTextureLookup([&](const char*) { return &texture; });
+    ASSERT_TRUE(renderer->BeginScene());
+    ox::core::CTimeManager time {[] { return 0.0; }};
+    ox::core::CTimerWrapper timer {time.AttachTimer(time.GetRoot())};
+    for (uint32_t i = 0; i < loader.Count(); ++i) {
+        CParticleSystem system;
+        if (!system.LoadDesc(loader.Records()[i]))
+            continue;
+        system.SetTimer(timer.Get());
+        system.AdvanceTime(1000, 20);
+        system.SetLocation(10, 20);
+        system.SetEmission(system.GetEmission() * 2);
+        system.AdvanceTime(200, 50);
+        system.Render(renderer.get());
+    }
+    renderer->Flush();
+    EXPECT_FALSE(backend->draws.empty());
+    CParticleSystem::SetTextureLookup(nullptr);
+}
