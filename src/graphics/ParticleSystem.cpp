@@ -240,6 +240,11 @@ void CParticleSystem::Emit(int dt)
             const float interval = 1000.0f / d.emission;
             count = std::trunc(m_EmitAccumulator / interval);
             m_EmitAccumulator -= static_cast<float>(count * interval);
+            // Extreme rates can make both infinite: nothing is emitted and the count starts over.
+            if (!std::isfinite(m_EmitAccumulator) || std::isnan(count)) {
+                m_EmitAccumulator = 0;
+                count = 0;
+            }
         } else {
             m_EmitAccumulator = 0;
         }
