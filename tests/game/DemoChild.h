@@ -1,5 +1,7 @@
 #pragma once
 
+#include "gui/BaseWindow.h"
+#include "gui/Widget.h"
 #include "support/TestSupport.h"
 
 #include <gtest/gtest.h>
@@ -56,5 +58,17 @@ struct DemoChild {
     std::string Output() const { return ReadFile(game / "k17_stdout.txt"); }
     std::string Errors() const { return ReadFile(game / "k17_stderr.txt"); }
 };
+
+// A left click on the widget `id` of `window`, handed to it as the widget manager would; false
+// when there is no such widget or it has no size to be clicked.
+inline bool PressWidget(ox::gui::CBaseWindow* window, const char* id)
+{
+    ox::gui::CWidget* widget = window ? window->GetWidget(id, true) : nullptr;
+    if (!widget || widget->GetSize().X <= 0 || widget->GetSize().Y <= 0)
+        return false;
+    widget->OnMouseDown({1, 1}, ox::gui::LeftButton, 0, false);
+    widget->OnMouseUp({1, 1}, ox::gui::LeftButton, 0, false);
+    return true;
+}
 
 } // namespace oxtest

@@ -1,5 +1,6 @@
 // The demo's mini-game headless: M opens it over the first window, two clicks light the three
 // lamps, and the window reads the game's result when the game ends.
+#include "DemoChild.h"
 #include "game/App.h"
 #include "gui/Window.h"
 #include "support/TestSupport.h"
@@ -10,16 +11,6 @@
 namespace fs = std::filesystem;
 
 namespace {
-
-bool Press(ox::gui::CBaseWindow* window, const char* id)
-{
-    ox::gui::CWidget* lamp = window ? window->GetWidget(id, true) : nullptr;
-    if (!lamp)
-        return false;
-    lamp->OnMouseDown({1, 1}, ox::gui::LeftButton, 0, false);
-    lamp->OnMouseUp({1, 1}, ox::gui::LeftButton, 0, false);
-    return true;
-}
 
 int PlayTheLamps()
 {
@@ -41,7 +32,7 @@ int PlayTheLamps()
     ox::gui::CBaseWindow* game = loading->GetChildWindow();
     if (!game || game->GetId() != "minigame")
         return 11;
-    if (!Press(game, "lamp1") || !Press(game, "lamp3"))
+    if (!oxtest::PressWidget(game, "lamp1") || !oxtest::PressWidget(game, "lamp3"))
         return 12;
     frames(2);
     app.Stop();

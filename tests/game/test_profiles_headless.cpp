@@ -71,17 +71,6 @@ TEST(DemoProfiles, ARestartContinuesWhereThePlayerLeft)
 
 namespace {
 
-// A left click on a box of a window, as the widget manager hands it on.
-bool Click(ox::gui::CBaseWindow* window, const char* id)
-{
-    ox::gui::CWidget* box = window ? window->GetWidget(id, true) : nullptr;
-    if (!box || box->GetSize().X <= 0 || box->GetSize().Y <= 0)
-        return false;
-    box->OnMouseDown({1, 1}, ox::gui::LeftButton, 0, false);
-    box->OnMouseUp({1, 1}, ox::gui::LeftButton, 0, false);
-    return true;
-}
-
 // The game in this process: P opens the chooser over the first window, a new player comes,
 // the records open over it and close, Play closes the chooser, F ends the level. Exit codes
 // above 0 say where it went wrong.
@@ -103,14 +92,14 @@ int PlayThePlayers()
     loading->OnKeyDown('P', 0, 0, false);
     frames(1);
     ox::gui::CBaseWindow* chooser = loading->GetChildWindow();
-    if (!chooser || !Click(chooser, "new_profile"))
+    if (!chooser || !oxtest::PressWidget(chooser, "new_profile"))
         return 11;
     if (!chooser->GetWidget("slot1", true) || chooser->GetWidget("slot1", true)->GetSize().X < 300)
         return 12;
-    if (!Click(chooser, "show_records") || !Click(chooser->GetChildWindow(), "close_records"))
+    if (!oxtest::PressWidget(chooser, "show_records") || !oxtest::PressWidget(chooser->GetChildWindow(), "close_records"))
         return 13;
     frames(1);
-    if (chooser->GetChildWindow() || !Click(chooser, "play"))
+    if (chooser->GetChildWindow() || !oxtest::PressWidget(chooser, "play"))
         return 14;
     frames(1);
     // The chooser is gone (the main menu may have come over the first window meanwhile).
