@@ -13,6 +13,9 @@
 #include "DemoChild.h"
 #include "support/TestSupport.h"
 
+#include <fstream>
+#include <sstream>
+
 namespace fs = std::filesystem;
 using namespace ox;
 
@@ -126,6 +129,20 @@ int PlayTheRecording()
     return 0;
 }
 
+// "moment <n> at <t> ms" of the first moment of a check file with a level's state in it.
+std::string FirstLevelMoment(const std::string& check)
+{
+    std::istringstream in(check);
+    std::string line, frame, state;
+    for (int header = 0; header < 4; ++header)
+        std::getline(in, line);
+    uint32_t time = 0;
+    for (int n = 1; in >> time >> frame >> state; ++n)
+        if (state != "00000000")
+            return "moment " + std::to_string(n) + " at " + std::to_string(time) + " ms";
+    return {};
+}
+
 // The line the last run printed about its check.
 std::string CheckLine(const std::string& output)
 {
@@ -147,7 +164,7 @@ TEST(DemoReplay, TheRecordingIsWhatThePlayThroughsStepsMake)
         << "games/demo/replay differs from what this test makes: run it with OX_WRITE_DEMO_REPLAY=1";
 }
 
-TEST(DemoReplay, TheRecordedPlayThroughFinishesTheLevelHeadlessWithTheSameHashesEveryRun)
+TEST(DemoReplay, ThePlayThroughEndsTheLevelTheSameEveryRunAndAChangedLevelReportsItsFirstDifference)
 {
     oxtest::DemoChild demo;
     fs::remove(demo.game / "replay.check");
@@ -172,4 +189,20 @@ TEST(DemoReplay, TheRecordedPlayThroughFinishesTheLevelHeadlessWithTheSameHashes
     // On the test clock a second run draws the same frames at the same moments.
     ASSERT_EQ(demo.Run(&PlayTheRecording, 90), 0) << demo.Output() << demo.Errors();
     EXPECT_EQ(CheckLine(demo.Output()), "replay check: checked, 11 moments, first difference: none") << check;
+
+    // One object's hint changed in the level's data: the first moment that shows the level
+    // reports its state, though the frame is the same.
+    const fs::path quest = demo.game / "properties" / "quest.xml";
+    std::string data = oxtest::ReadFile(quest);
+    const std::string shell = "id=\"shell\" object_flags=\"0\" hint=\"$307\"";
+    const size_t found = data.find(shell);
+    ASSERT_NE(found, std::string::npos) << "the demo's shell has another hint now: change this test";
+    data.replace(found, shell.size(), "id=\"shell\" object_flags=\"0\" hint=\"$306\"");
+    std::ofstream(quest, std::ios::binary | std::ios::trunc) << data;
+    const std::string first = FirstLevelMoment(check);
+    ASSERT_FALSE(first.empty()) << "no moment shows the level:\n" << check;
+    ASSERT_EQ(demo.Run(&PlayTheRecording, 90), 0) << demo.Output() << demo.Errors();
+    EXPECT_EQ(CheckLine(demo.Output()).rfind("replay check: checked, 11 moments, first difference: " + first +
+                                             ": the level state differs (", 0), 0u)
+        << CheckLine(demo.Output()) << "\n" << check;
 }
