@@ -12,7 +12,10 @@
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ComboBoxWidget.h"
+#include "gui/controls/ListWidget.h"
 #include "gui/controls/ScrollWidget.h"
+#include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolTipHelperWidget.h"
 #include "gui/controls/ToolbarWidget.h"
 #include "gui/Window.h"
@@ -396,6 +399,56 @@ void BindControls(mluabind::Namespace& ns)
     AddCast<CWindow>(ns, "CWindow.Cast");
 }
 
+constexpr NamedValue kListColors[] = {
+    {"ListColorTextNormal", CListWidget::ListColorTextNormal},
+    {"ListColorTextSelected", CListWidget::ListColorTextSelected},
+    {"ListColorTextOver", CListWidget::ListColorTextOver},
+    {"ListColorSelection", CListWidget::ListColorSelection},
+};
+
+// The line operations a list and a combo box share; texts come as wide strings or plain
+// Lua strings.
+template <class W, class C>
+C& LineMethods(C& cls)
+{
+    return cls.Method("ClearLines", &W::ClearLines)
+        .Method("EnumLines", &W::EnumLines)
+        .Method("AddLine", [](W& w, const char16_t* text) { w.AddLine(text ? text : u""); })
+        .Method("GetLine", &W::GetLine)
+        .Method("FindLine", [](const W& w, const char16_t* text) { return w.FindLine(text ? text : u""); })
+        .Method("SetLine", [](W& w, int index, const char16_t* text) { w.SetLine(index, text ? text : u""); })
+        .Method("RemoveLine", &W::RemoveLine)
+        .Method("SelectLine", &W::SelectLine)
+        .Method("GetSelectedLine", &W::GetSelectedLine);
+}
+
+mluabind::i::GenericClass& ListWidgetClass()
+{
+    using W = CListWidget;
+    auto& cls = Class<W>("CListWidget").BaseClass<CWidget>().Constructor<>();
+    LineMethods<W>(cls)
+        .Method("CalcHeightToFitLines", &W::CalcHeightToFitLines)
+        .Method("SetListHeight", &W::SetListHeight)
+        .Method("GetScrollWidth", &W::GetScrollWidth)
+        .Method("SetScrollValue", &W::SetScrollValue)
+        .Method("GetScrollValue", &W::GetScrollValue)
+        .Method("SetLineJustifications", &W::SetLineJustifications)
+        .Method("SetListColors", &W::SetListColors)
+        .Method("OnLineSelected", &W::OnLineSelected);
+    return WithConstants(cls, kListColors);
+}
+
+mluabind::i::GenericClass& ComboBoxWidgetClass()
+{
+    using W = CComboBoxWidget;
+    auto& cls = Class<W>("CComboBoxWidget").BaseClass<CWidget>().Constructor<>();
+    return LineMethods<W>(cls)
+        .Method("ShowList", &W::ShowList)
+        .Method("IsListShown", &W::IsListShown)
+        .Method("GetText", &W::GetText)
+        .Method("OnLineSelected", &W::OnLineSelected);
+}
+
 // The value controls: scroll bar, slider, list and combo box.
 void BindValueControls(mluabind::Namespace& ns)
 {
@@ -414,6 +467,20 @@ void BindValueControls(mluabind::Namespace& ns)
                     .Method("SetImages", &S::SetImages)
                     .Method("OnValueChanged", &S::OnValueChanged));
     AddCast<S>(ns, "CScrollWidget.Cast");
+    using L = CSliderWidget;
+    ns.AddClass(Class<L>("CSliderWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("SetValue", &L::SetValue)
+                    .Method("GetValue", &L::GetValue)
+                    .Method("SetImages", &L::SetImages)
+                    .Method("OnValueChanged", &L::OnValueChanged));
+    AddCast<L>(ns, "CSliderWidget.Cast");
+    ns.AddClass(Class<CThumbWidget>("CThumbWidget").BaseClass<CImageWidget>().Constructor<>());
+    ns.AddClass(ListWidgetClass());
+    AddCast<CListWidget>(ns, "CListWidget.Cast");
+    ns.AddClass(ComboBoxWidgetClass());
+    AddCast<CComboBoxWidget>(ns, "CComboBoxWidget.Cast");
 }
 
 } // namespace

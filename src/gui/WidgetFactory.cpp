@@ -9,7 +9,10 @@
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ComboBoxWidget.h"
+#include "gui/controls/ListWidget.h"
 #include "gui/controls/ScrollWidget.h"
+#include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolbarWidget.h"
 
 namespace ox::gui {
@@ -69,6 +72,9 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CClipWidget>("clip_widget");
     factory.RegisterWidget<CToolbarWidget>("toolbar_widget");
     factory.RegisterWidget<CScrollWidget>("scroll_widget");
+    factory.RegisterWidget<CListWidget>("list_widget");
+    factory.RegisterWidget<CComboBoxWidget>("combobox_widget");
+    factory.RegisterWidget<CSliderWidget>("slider_widget");
 }
 
 } // namespace ox::gui
