@@ -487,7 +487,8 @@ TEST_F(ListsTest, ComboBoxOpensByItsButtonAndAPickedLineBecomesItsText)
 {
     Show(R"(<combobox_widget id="cb" combobox_template="c" x="100" y="100" width="150" abs_pos="true" selected="1">
               <strings><string text="a"/><string text="b"/><string text="c"/></strings>
-            </combobox_widget>)");
+            </combobox_widget>
+            <slider_widget id="under" slider_template="s" x="100" y="160" width="150" abs_pos="true"/>)");
     auto& combo = Get<CComboBoxWidget>("cb");
     EXPECT_EQ(combo.GetText(), u"b");
     EXPECT_EQ(combo.GetSize(), FloatVector(150, 20)) << "as high as the label's text";
@@ -503,13 +504,14 @@ TEST_F(ListsTest, ComboBoxOpensByItsButtonAndAPickedLineBecomesItsText)
     EXPECT_EQ(combo.GetSize(), FloatVector(150, 120));
     EXPECT_EQ(combo.GetList()->GetOffset(), FloatVector(0, 20));
 
-    oxtest::SendClick(*platform, 150, 120 + 50); // the third line
+    oxtest::SendClick(*platform, 150, 120 + 50); // the third line, over the slider after the box
     EXPECT_FALSE(combo.IsListShown());
     EXPECT_EQ(combo.GetText(), u"c");
     EXPECT_EQ(combo.GetSelectedLine(), 2);
     EXPECT_EQ(Told("cb"), Strings {"line_selected"});
     EXPECT_EQ(TakeSounds(), (Strings {"pick", "pick"}));
     EXPECT_EQ(combo.GetSize(), FloatVector(150, 20));
+    EXPECT_EQ(Get<CSliderWidget>("under").GetValue(), 0.0f);
 
     // Open, then a press elsewhere closes it without choosing.
     oxtest::SendClick(*platform, 240, 108);

@@ -36,6 +36,9 @@ CComboBoxWidget::CComboBoxWidget()
       m_List(new CListWidget())
 {
     SetBroadcastMask(GetBroadcastMask() | BroadcastOnMouseDown);
+    // The chosen line stands at the left, in the middle of the box's height, unless the
+    // template says otherwise.
+    GetLabel()->SetJustifications(-1, 0);
     AddWidget(m_Back);
     AddWidget(m_Button);
     AddWidget(m_Label);
@@ -136,6 +139,7 @@ void CComboBoxWidget::ShowList(bool show)
     if (show) {
         m_List->RemFlags(FlagHidden | FlagDisabled);
         ChooseListPlace();
+        ComeToFront();
     } else {
         m_List->AddFlags(FlagHidden | FlagDisabled);
         m_OpenUp = false;
@@ -146,6 +150,22 @@ void CComboBoxWidget::ShowList(bool show)
     SetSize(GetSize().X, m_BoxHeight);
     if (show)
         TellParent(*this, "list_showed");
+}
+
+// An open list lies over the widgets after the box: the box goes in front of its siblings
+// (those always on top stay in front).
+void CComboBoxWidget::ComeToFront()
+{
+    CBaseWidget* parent = GetParentWidget();
+    if (!parent)
+        return;
+    for (const WidgetPtrT& sibling : parent->GetWidgets()) {
+        if (sibling->GetLayer() == LayerAlwaysOnTop)
+            continue;
+        if (sibling.get() != this)
+            LayInFront(*sibling);
+        return;
+    }
 }
 
 bool CComboBoxWidget::IsListShown() const { return !Hidden(m_List); }

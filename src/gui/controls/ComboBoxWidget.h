@@ -64,6 +64,7 @@ private:
     void Arrange();
     // The list's height and whether it opens upwards, by the room on the canvas.
     void ChooseListPlace();
+    void ComeToFront();
 
     WidgetPtrT m_Back;
     WidgetPtrT m_Button;
