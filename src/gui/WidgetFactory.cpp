@@ -4,6 +4,7 @@
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
 #include "gui/controls/ClipWidget.h"
+#include "gui/controls/EditWidget.h"
 #include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 #include "gui/controls/LabelWidget.h"
@@ -67,6 +68,7 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CLuaWidget>("lua_widget");
     factory.RegisterWidget<CClipWidget>("clip_widget");
     factory.RegisterWidget<CToolbarWidget>("toolbar_widget");
+    factory.RegisterWidget<CEditWidget>("edit_widget");
 }
 
 } // namespace ox::gui

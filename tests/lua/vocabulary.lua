@@ -191,6 +191,8 @@ V.controls = {
         ["ox.gui.CProgressBarWidget"] = { "SetImages", "SetValue" },
         ["ox.gui.CToolbarWidget"] = {},
         ["ox.gui.CToolTipHelperWidget"] = { "StopShowToolTip" },
+        ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
+                                   "SetMaxChars", "OnTextChanged" },
     },
 }
 
@@ -211,8 +213,6 @@ V.pending = {
         classes = {
             ["ox.gui.CComboBoxWidget"] = { "ClearLines", "EnumLines", "AddLine", "GetLine", "FindLine", "SetLine",
                                            "RemoveLine", "SelectLine", "GetSelectedLine", "ShowList" },
-            ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
-                                       "SetMaxChars", "OnTextChanged" },
             ["ox.gui.CListWidget"] = {
                 "CalcHeightToFitLines", "SetListHeight", "EnumLines", "ClearLines", "AddLine", "GetLine", "FindLine",
                 "SetLine", "RemoveLine", "SelectLine", "GetSelectedLine", "GetScrollWidth", "SetLineJustifications",
