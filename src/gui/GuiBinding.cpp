@@ -7,6 +7,7 @@
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
 #include "gui/controls/ClipWidget.h"
+#include "gui/controls/EditWidget.h"
 #include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 #include "gui/controls/LabelWidget.h"
@@ -354,6 +355,22 @@ void AddCast(mluabind::Namespace& ns, const char* name)
     ns.AddFunction(mluabind::Function(name, [](CBaseWidget* widget) { return dynamic_cast<W*>(widget); }));
 }
 
+void BindEditWidget(mluabind::Namespace& ns)
+{
+    using E = CEditWidget;
+    ns.AddClass(Class<E>("CEditWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("SetEditColors", &E::SetEditColors)
+                    .Method("SelectText", &E::SelectText)
+                    .Method("SetText", &E::SetText)
+                    .Method("GetText", &E::GetText)
+                    .Method("SetTextJustification", &E::SetTextJustification)
+                    .Method("SetMaxChars", &E::SetMaxChars)
+                    .Method("OnTextChanged", &E::OnTextChanged));
+    AddCast<E>(ns, "CEditWidget.Cast");
+}
+
 void BindControls(mluabind::Namespace& ns)
 {
     ns.AddClass(ImageWidgetClass());
@@ -397,6 +414,7 @@ void BindControls(mluabind::Namespace& ns)
     AddCast<CToolbarWidget>(ns, "CToolbarWidget.Cast");
     AddCast<CImageBoxWidget>(ns, "CImageBoxWidget.Cast");
     AddCast<CWindow>(ns, "CWindow.Cast");
+    BindEditWidget(ns);
 }
 
 constexpr NamedValue kListColors[] = {
