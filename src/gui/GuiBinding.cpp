@@ -14,6 +14,7 @@
 #include "gui/controls/RadioButtonGroupWidget.h"
 #include "gui/controls/ToolTipHelperWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 #include "gui/Window.h"
 #include "gui/WidgetManager.h"
 #include "lua/Lua.h"
@@ -350,6 +351,21 @@ void AddCast(mluabind::Namespace& ns, const char* name)
     ns.AddFunction(mluabind::Function(name, [](CBaseWidget* widget) { return dynamic_cast<W*>(widget); }));
 }
 
+// The composite controls: tabs.
+void BindComposites(mluabind::Namespace& ns)
+{
+    using T = CTabWidget;
+    ns.AddClass(Class<T>("CTabWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("EnumPanels", &T::EnumPanels)
+                    .Method("SelectPanel", &T::SelectPanel)
+                    .Method("GetSelectedPanel", &T::GetSelectedPanel)
+                    .Method("GetPanelContent", static_cast<CWidget* (T::*)(int) const>(&T::GetPanelContent))
+                    .Method("GetPanelContent", static_cast<CWidget* (T::*)(const wstring&) const>(&T::GetPanelContent)));
+    AddCast<T>(ns, "CTabWidget.Cast");
+}
+
 void BindControls(mluabind::Namespace& ns)
 {
     ns.AddClass(ImageWidgetClass());
@@ -414,6 +430,7 @@ mluabind::Namespace BindGui()
     ns.AddFunction(mluabind::Function("g_Cursor.Instance", &CCursor::Instance));
     ns.AddClass(Class<CWidgetManager>("CWidgetManager").Method("GetKeyboardState", &CWidgetManager::GetKeyboardState));
     BindEffects(ns);
+    BindComposites(ns);
     BindControls(ns);
     return ns;
 }

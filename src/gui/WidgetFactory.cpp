@@ -10,6 +10,7 @@
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 
 namespace ox::gui {
 
@@ -67,6 +68,7 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CLuaWidget>("lua_widget");
     factory.RegisterWidget<CClipWidget>("clip_widget");
     factory.RegisterWidget<CToolbarWidget>("toolbar_widget");
+    factory.RegisterWidget<CTabWidget>("tab_widget");
 }
 
 } // namespace ox::gui

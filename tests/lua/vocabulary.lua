@@ -191,6 +191,7 @@ V.controls = {
         ["ox.gui.CProgressBarWidget"] = { "SetImages", "SetValue" },
         ["ox.gui.CToolbarWidget"] = {},
         ["ox.gui.CToolTipHelperWidget"] = { "StopShowToolTip" },
+        ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
     },
 }
 
@@ -225,7 +226,6 @@ V.pending = {
             ["ox.gui.CSliderWidget"] = { "SetValue", "GetValue", "OnValueChanged" },
             ["ox.gui.CTableWidget"] = { "GetCell", "LoadRow", "FitCells", "GetCellsCount", "ClearTable", "SelectRow",
                                         "GetSelectedRow" },
-            ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
             ["ox.gui.CTreeWidget"] = {},
         },
     },
