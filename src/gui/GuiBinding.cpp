@@ -12,6 +12,7 @@
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ScrollWidget.h"
 #include "gui/controls/ToolTipHelperWidget.h"
 #include "gui/controls/ToolbarWidget.h"
 #include "gui/controls/TabWidget.h"
@@ -411,6 +412,26 @@ void BindControls(mluabind::Namespace& ns)
     AddCast<CWindow>(ns, "CWindow.Cast");
 }
 
+// The value controls: scroll bar, slider, list and combo box.
+void BindValueControls(mluabind::Namespace& ns)
+{
+    using S = CScrollWidget;
+    ns.AddClass(Class<S>("CScrollWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Constructor<bool>()
+                    .Method("SetValue", &S::SetValue)
+                    .Method("GetValue", &S::GetValue)
+                    .Method("SetMaxValue", &S::SetMaxValue)
+                    .Method("GetMaxValue", &S::GetMaxValue)
+                    .Method("SetPageSize", &S::SetPageSize)
+                    .Method("GetPageSize", &S::GetPageSize)
+                    .Method("SetButtonValue", &S::SetButtonValue)
+                    .Method("SetImages", &S::SetImages)
+                    .Method("OnValueChanged", &S::OnValueChanged));
+    AddCast<S>(ns, "CScrollWidget.Cast");
+}
+
 } // namespace
 
 mluabind::Namespace BindGui()
@@ -432,6 +453,7 @@ mluabind::Namespace BindGui()
     BindEffects(ns);
     BindComposites(ns);
     BindControls(ns);
+    BindValueControls(ns);
     return ns;
 }
 

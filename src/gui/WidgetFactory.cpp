@@ -9,6 +9,7 @@
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ScrollWidget.h"
 #include "gui/controls/ToolbarWidget.h"
 #include "gui/controls/TabWidget.h"
 
@@ -68,6 +69,7 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CLuaWidget>("lua_widget");
     factory.RegisterWidget<CClipWidget>("clip_widget");
     factory.RegisterWidget<CToolbarWidget>("toolbar_widget");
+    factory.RegisterWidget<CScrollWidget>("scroll_widget");
     factory.RegisterWidget<CTabWidget>("tab_widget");
 }
 

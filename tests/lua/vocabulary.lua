@@ -191,6 +191,8 @@ V.controls = {
         ["ox.gui.CProgressBarWidget"] = { "SetImages", "SetValue" },
         ["ox.gui.CToolbarWidget"] = {},
         ["ox.gui.CToolTipHelperWidget"] = { "StopShowToolTip" },
+        ["ox.gui.CScrollWidget"] = { "SetValue", "GetValue", "SetMaxValue", "GetMaxValue", "SetPageSize",
+                                     "GetPageSize", "OnValueChanged", "SetButtonValue" },
         ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
     },
 }
@@ -221,8 +223,6 @@ V.pending = {
                 constants = { ListColorTextNormal = 0, ListColorTextSelected = 1, ListColorTextOver = 2,
                               ListColorSelection = 3 },
             },
-            ["ox.gui.CScrollWidget"] = { "SetValue", "GetValue", "SetMaxValue", "GetMaxValue", "SetPageSize",
-                                         "GetPageSize", "OnValueChanged", "SetButtonValue" },
             ["ox.gui.CSliderWidget"] = { "SetValue", "GetValue", "OnValueChanged" },
             ["ox.gui.CTableWidget"] = { "GetCell", "LoadRow", "FitCells", "GetCellsCount", "ClearTable", "SelectRow",
                                         "GetSelectedRow" },
