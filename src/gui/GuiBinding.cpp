@@ -19,6 +19,7 @@
 #include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolTipHelperWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 #include "gui/Window.h"
 #include "gui/WidgetManager.h"
 #include "lua/Lua.h"
@@ -371,6 +372,21 @@ void BindEditWidget(mluabind::Namespace& ns)
     AddCast<E>(ns, "CEditWidget.Cast");
 }
 
+// The composite controls: tabs.
+void BindComposites(mluabind::Namespace& ns)
+{
+    using T = CTabWidget;
+    ns.AddClass(Class<T>("CTabWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("EnumPanels", &T::EnumPanels)
+                    .Method("SelectPanel", &T::SelectPanel)
+                    .Method("GetSelectedPanel", &T::GetSelectedPanel)
+                    .Method("GetPanelContent", static_cast<CWidget* (T::*)(int) const>(&T::GetPanelContent))
+                    .Method("GetPanelContent", static_cast<CWidget* (T::*)(const wstring&) const>(&T::GetPanelContent)));
+    AddCast<T>(ns, "CTabWidget.Cast");
+}
+
 void BindControls(mluabind::Namespace& ns)
 {
     ns.AddClass(ImageWidgetClass());
@@ -520,6 +536,7 @@ mluabind::Namespace BindGui()
     ns.AddFunction(mluabind::Function("g_Cursor.Instance", &CCursor::Instance));
     ns.AddClass(Class<CWidgetManager>("CWidgetManager").Method("GetKeyboardState", &CWidgetManager::GetKeyboardState));
     BindEffects(ns);
+    BindComposites(ns);
     BindControls(ns);
     BindValueControls(ns);
     return ns;

@@ -15,6 +15,7 @@
 #include "gui/controls/ScrollWidget.h"
 #include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 
 namespace ox::gui {
 
@@ -77,6 +78,7 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CComboBoxWidget>("combobox_widget");
     factory.RegisterWidget<CSliderWidget>("slider_widget");
     factory.RegisterWidget<CEditWidget>("edit_widget");
+    factory.RegisterWidget<CTabWidget>("tab_widget");
 }
 
 } // namespace ox::gui

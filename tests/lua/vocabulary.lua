@@ -205,6 +205,7 @@ V.controls = {
         ["ox.gui.CSliderWidget"] = { "SetValue", "GetValue", "OnValueChanged" },
         ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
                                    "SetMaxChars", "OnTextChanged" },
+        ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
     },
 }
 
@@ -225,7 +226,6 @@ V.pending = {
         classes = {
             ["ox.gui.CTableWidget"] = { "GetCell", "LoadRow", "FitCells", "GetCellsCount", "ClearTable", "SelectRow",
                                         "GetSelectedRow" },
-            ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
             ["ox.gui.CTreeWidget"] = {},
         },
     },
