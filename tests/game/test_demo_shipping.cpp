@@ -106,3 +106,22 @@ TEST(DemoShipping, TheFontsRegenerateByteForByte)
             << kept << " differs from what games/demo/make-fonts.sh makes";
     }
 }
+
+TEST(DemoShipping, TheStagedDemoStartsFromItsPack)
+{
+    oxtest::DemoChild demo;
+    demo.game = demo.dir / "run";
+    const std::string command = std::string("sh '") + OX_DEMO_GAME + "/stage-run.sh' '" + OX_TOOLS_DIR + "' '" +
+                                demo.game.string() + "'";
+    ASSERT_EQ(RunScript(command, demo.dir / "stage.txt"), 0) << oxtest::ReadFile(demo.dir / "stage.txt");
+    // Nothing of the game lies loose beside the pack: what the game reads comes from it.
+    EXPECT_TRUE(fs::is_regular_file(demo.game / "game.pack"));
+    for (const char* loose : {"game.xml", "properties", "scripts", "textures", "!langs"})
+        EXPECT_FALSE(fs::exists(demo.game / loose)) << loose;
+    // The start-up pictures beside it would show for twelve seconds first.
+    fs::remove_all(demo.game / "fsdata");
+    fs::remove_all(demo.game / "branch");
+    const int result = demo.Run(&OpenTheMenuInRussian, 90);
+    EXPECT_EQ(result, 0) << demo.Output() << demo.Errors();
+    EXPECT_NE(demo.Output().find("The menu: Фонарь, Играть"), std::string::npos) << demo.Output();
+}
