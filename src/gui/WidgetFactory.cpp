@@ -10,7 +10,12 @@
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ComboBoxWidget.h"
+#include "gui/controls/ListWidget.h"
+#include "gui/controls/ScrollWidget.h"
+#include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 
 namespace ox::gui {
 
@@ -68,7 +73,12 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CLuaWidget>("lua_widget");
     factory.RegisterWidget<CClipWidget>("clip_widget");
     factory.RegisterWidget<CToolbarWidget>("toolbar_widget");
+    factory.RegisterWidget<CScrollWidget>("scroll_widget");
+    factory.RegisterWidget<CListWidget>("list_widget");
+    factory.RegisterWidget<CComboBoxWidget>("combobox_widget");
+    factory.RegisterWidget<CSliderWidget>("slider_widget");
     factory.RegisterWidget<CEditWidget>("edit_widget");
+    factory.RegisterWidget<CTabWidget>("tab_widget");
 }
 
 } // namespace ox::gui

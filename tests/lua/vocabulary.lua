@@ -191,8 +191,21 @@ V.controls = {
         ["ox.gui.CProgressBarWidget"] = { "SetImages", "SetValue" },
         ["ox.gui.CToolbarWidget"] = {},
         ["ox.gui.CToolTipHelperWidget"] = { "StopShowToolTip" },
+        ["ox.gui.CScrollWidget"] = { "SetValue", "GetValue", "SetMaxValue", "GetMaxValue", "SetPageSize",
+                                     "GetPageSize", "OnValueChanged", "SetButtonValue" },
+        ["ox.gui.CComboBoxWidget"] = { "ClearLines", "EnumLines", "AddLine", "GetLine", "FindLine", "SetLine",
+                                       "RemoveLine", "SelectLine", "GetSelectedLine", "ShowList" },
+        ["ox.gui.CListWidget"] = {
+            "CalcHeightToFitLines", "SetListHeight", "EnumLines", "ClearLines", "AddLine", "GetLine", "FindLine",
+            "SetLine", "RemoveLine", "SelectLine", "GetSelectedLine", "GetScrollWidth", "SetLineJustifications",
+            "SetListColors", "OnLineSelected",
+            constants = { ListColorTextNormal = 0, ListColorTextSelected = 1, ListColorTextOver = 2,
+                          ListColorSelection = 3 },
+        },
+        ["ox.gui.CSliderWidget"] = { "SetValue", "GetValue", "OnValueChanged" },
         ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
                                    "SetMaxChars", "OnTextChanged" },
+        ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
     },
 }
 
@@ -211,21 +224,8 @@ V.pending = {
     },
     widgets = {
         classes = {
-            ["ox.gui.CComboBoxWidget"] = { "ClearLines", "EnumLines", "AddLine", "GetLine", "FindLine", "SetLine",
-                                           "RemoveLine", "SelectLine", "GetSelectedLine", "ShowList" },
-            ["ox.gui.CListWidget"] = {
-                "CalcHeightToFitLines", "SetListHeight", "EnumLines", "ClearLines", "AddLine", "GetLine", "FindLine",
-                "SetLine", "RemoveLine", "SelectLine", "GetSelectedLine", "GetScrollWidth", "SetLineJustifications",
-                "SetListColors", "OnLineSelected",
-                constants = { ListColorTextNormal = 0, ListColorTextSelected = 1, ListColorTextOver = 2,
-                              ListColorSelection = 3 },
-            },
-            ["ox.gui.CScrollWidget"] = { "SetValue", "GetValue", "SetMaxValue", "GetMaxValue", "SetPageSize",
-                                         "GetPageSize", "OnValueChanged", "SetButtonValue" },
-            ["ox.gui.CSliderWidget"] = { "SetValue", "GetValue", "OnValueChanged" },
             ["ox.gui.CTableWidget"] = { "GetCell", "LoadRow", "FitCells", "GetCellsCount", "ClearTable", "SelectRow",
                                         "GetSelectedRow" },
-            ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
             ["ox.gui.CTreeWidget"] = {},
         },
     },
