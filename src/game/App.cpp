@@ -19,6 +19,7 @@
 #include "gui/Cursor.h"
 #include "gui/GuiServices.h"
 #include "gui/WidgetFactory.h"
+#include "gui/controls/EditWidget.h"
 #include "lua/LuaHeap.h"
 #include "graphics/Font.h"
 #include "graphics/ParticleSystem.h"
@@ -234,6 +235,10 @@ bool CApp::Init()
     // The quest: the pack's compiled form, or quest.xml compiled now. Levels are built from it
     // on demand, binding their textures and clips.
     qe::g_QuestData::Instance().Load();
+    // Characters no text box takes (players' names among them).
+    static constexpr char16_t kForbidden[] = u"~`!@#$%^&*()_+=-?/.,|\"':[;{]}\\<> \u0412\u00B1\u0412\u00A7\u0432\u201E\u2013";
+    static_assert(std::size(kForbidden) == 41);
+    gui::CEditWidget::SetForbiddenSymbols(kForbidden);
     // Clips draw the declared textures and fonts.
     misc::anim::ClipServices& clips = misc::anim::GetClipServices();
     clips.textures = [](const char* id) -> const graphics::CTexture* {

@@ -2,6 +2,7 @@
 
 #include "diag/Assert.h"
 #include "game/Achievements.h"
+#include "game/FontViewerWindow.h"
 #include "game/GameOptions.h"
 #include "game/Profile.h"
 #include "game/RecordTable.h"
@@ -214,6 +215,7 @@ mluabind::Namespace BindGameClasses()
     ns.AddFunction(mluabind::Function("CharToInt", &CharToInt));
     ns.AddFunction(mluabind::Function("misc.CreateGUIDString", &CreateGUIDString));
     ns.AddFunction(mluabind::Function("misc.ExecuteFile", &ExecuteFile));
+    BindFontViewer(ns);
     return ns;
 }
 

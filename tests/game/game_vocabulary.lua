@@ -1,8 +1,7 @@
 -- The game's script vocabulary as data, for the walk of tests/lua/vocabulary.lua.
 --
 -- `main` must stand whole in the main state, `level` in a level's state once __QEBindGame ran
--- for it, and `achievements` (this game's own store, which the level's rules use) in both. `pending` lists the
--- names of later work, by topic: reported, present or not.
+-- for it, and `achievements` (this game's own store, which the level's rules use) in both.
 
 local V = {}
 
@@ -47,6 +46,7 @@ V.main = {
         ["k17.RecordInfo"] = { members = { "Name", "Score" } },
         ["k17.CRecordTable"] = { "AddRecord", "Clear", "GetLastRecordPos", "GetRecords", "Save" },
         ["k17.CRecordTable.RecordsIteratorT"] = { Get = 2, "Next", "IsEnd" },
+        ["k17.CFontViewerWindow"] = {}, ["k17.CFontViewerWindowPtrT"] = {},
     },
 }
 
@@ -74,12 +74,6 @@ V.achievements = {
 
 V.window_effects = {
     functions = { "k17.AddEffectToWidget", "k17.AddRemoveEffectToWidget" },
-}
-
-V.pending = {
-    font_viewer = {
-        classes = { ["k17.CFontViewerWindow"] = {} },
-    },
 }
 
 V.minigames = {

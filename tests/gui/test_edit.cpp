@@ -8,6 +8,7 @@
 #include "gui/ControlTestSupport.h"
 #include "gui/StateHistory.h"
 #include "gui/controls/EditWidget.h"
+#include "gui/controls/ScrollWidget.h"
 #include "support/FakePlatform.h"
 
 using namespace ox::gui;
@@ -24,9 +25,21 @@ const char* kWindow = R"(
     <edit_widget id="name" edit_template="plain" x="300" y="200" width="200" max_chars="8" abs_pos="true"/>
     <edit_widget id="notes" edit_template="plain" multiline="true" x="300" y="400" width="200" height="100"
                  abs_pos="true"/>
+    <edit_widget id="long" edit_template="scrolled" horz_scroll="true" x="300" y="600" width="60" height="40"
+                 abs_pos="true"/>
+    <edit_widget id="lines" edit_template="scrolled" multiline="true" vert_scroll="true" x="600" y="400" width="200"
+                 height="64" abs_pos="true"/>
   </window>
   <GUITemplates>
     <edit_template id="plain" font="mono" cursor_image="caret"><insets left="4" top="2" right="4" bottom="2"/></edit_template>
+    <edit_template id="scrolled" font="mono" cursor_image="caret">
+      <insets left="4" top="2" right="4" bottom="2"/>
+      <horizontal_scroll scroll_template="h"/>
+      <vertical_scroll scroll_template="v"/>
+    </edit_template>
+    <scroll_template id="v" vertical="true" thumb_image="strip" back_image="box" top_image="strip" bottom_image="strip"/>
+    <scroll_template id="h" vertical="false" thumb_image="strip" back_image="frame" top_image="strip"
+                     bottom_image="strip"/>
   </GUITemplates>)";
 
 struct EditTest : oxtest::ControlFixture {
@@ -250,6 +263,43 @@ TEST_F(EditTest, TheCaretFollowsClicksAndLinesInABoxAwayFromTheOrigin)
     EXPECT_EQ(notes->GetCursorPos(), 2) << "right of a line's end stays before its line break";
     oxtest::SendClick(*platform, 310, 490);
     EXPECT_EQ(notes->GetCursorPos(), 4) << "below the text counts on its last line";
+}
+
+TEST_F(EditTest, ScrollBarsKeepTheCaretInViewAndTakeItAlong)
+{
+    // 52 pixels of text show in the one-line box, above its 16-pixel bar.
+    auto* single = dynamic_cast<CEditWidget*>(window->GetWidget("long"));
+    ASSERT_TRUE(single && single->GetHorzScroll() && !single->GetVertScroll());
+    EXPECT_EQ(single->GetHorzScroll()->GetSize(), FloatVector(60, 16));
+    oxtest::SendClick(*platform, 305, 610);
+    Type("abcabcab");
+    // The last character's right edge (87) at the visible right edge (52).
+    EXPECT_EQ(single->GetHorzScroll()->GetValue(), 35.0f);
+    EXPECT_EQ(single->GetCursorWidget()->GetOffset().X, 55.0f);
+    Key(SDL_SCANCODE_HOME);
+    EXPECT_EQ(single->GetHorzScroll()->GetValue(), 0.0f);
+    Key(SDL_SCANCODE_END);
+    oxtest::SendClick(*platform, 306, 610);
+    EXPECT_EQ(single->GetCursorPos(), 3) << "a click counts in the scrolled text";
+
+    // Three lines show beside the vertical bar; the fourth scrolls one line's height.
+    auto* lines = dynamic_cast<CEditWidget*>(window->GetWidget("lines"));
+    ASSERT_TRUE(lines && lines->GetVertScroll());
+    EXPECT_EQ(lines->GetVertScroll()->GetOffset(), FloatVector(184, 0));
+    oxtest::SendClick(*platform, 610, 410);
+    for (const char* line : {"a", "b", "c"}) {
+        Type(line);
+        Key(SDL_SCANCODE_RETURN);
+    }
+    Type("a");
+    EXPECT_EQ(lines->GetVertScroll()->GetValue(), 20.0f);
+    EXPECT_EQ(lines->GetCursorWidget()->GetOffset().Y, 42.0f);
+    // The bar moved by a script takes the caret with the text.
+    lines->GetVertScroll()->SetValue(0);
+    EXPECT_EQ(lines->GetCursorWidget()->GetOffset().Y, 62.0f);
+    Key(SDL_SCANCODE_PAGEUP);
+    EXPECT_EQ(lines->GetVertScroll()->GetValue(), 0.0f);
+    EXPECT_EQ(lines->GetCursorWidget()->GetOffset().Y, 2.0f);
 }
 
 TEST(StateHistory, KeepsTheLimitPlusOneAndAnEqualStateAddsNothing)

@@ -1,7 +1,7 @@
 -- Lantern Demo: players, their options and the table of records. main.lua loads this file
 -- last. At the start the player of the last session goes on where they left the level. In
--- the first window P opens the players' chooser (gui.xml,
--- window "profiles"), R the records and F ends the level now (a shortcut until the level
+-- the first window P opens the players' chooser (gui.xml, window "profiles", where a new
+-- player's name is typed), R the records and F ends the level now (a shortcut until the level
 -- can be played to its end). The level's state goes into the player's save file when the game
 -- closes, when another player takes over and when the level ends.
 
@@ -95,13 +95,21 @@ function Profiles.Switch(name)
     Profiles.RestoreLevel()
 end
 
-function Profiles.NewPlayer()
-    local n = manager().EnumProfiles() + 1
-    while manager().GetProfile("Player " .. n) do
-        n = n + 1
+-- A new player by the name typed for them, or "Player <n>" without one. A name that is
+-- taken makes that player current.
+function Profiles.NewPlayer(typed)
+    local name = typed or ""
+    if name == "" then
+        local n = manager().EnumProfiles() + 1
+        while manager().GetProfile("Player " .. n) do
+            n = n + 1
+        end
+        name = "Player " .. n
     end
-    local name = "Player " .. n
-    manager().CreateProfile(name, false)
+    if not manager().GetProfile(name) then
+        manager().CreateProfile(name, false)
+        print("Lantern Demo: new player " .. name)
+    end
     Profiles.Switch(name)
     return name
 end
@@ -133,6 +141,7 @@ local function close(wnd)
 end
 
 function Profiles.OpenChooser()
+    Profiles.typing = false
     local wnd = demo.OpenWindow("profiles")
     if wnd then
         print("Lantern Demo: the players' chooser opens")
@@ -174,13 +183,30 @@ function Profiles.FillRecords(wnd)
     end
 end
 
+-- The box a new player's name is typed in, or nil.
+local function name_box(wnd)
+    local widget = wnd.GetWidget("new_name", true)
+    return type(widget) == "userdata" and ox.gui.CEditWidget.Cast(widget) or nil
+end
+
 function ProfilesWnd.OnChildAction(wnd, action, sender)
     local id = S(sender.GetId())
     local slot = tonumber(id:match("^slot(%d)$") or "")
-    if slot and Profiles.slots and Profiles.slots[slot] ~= "" then
+    if id == "new_name" then
+        -- Typing changes nothing until "New player"; while the box has the focus the first
+        -- window's letter keys are letters of a name.
+        if action == "got_focus" or action == "lost_focus" then
+            Profiles.typing = action == "got_focus"
+        end
+        return true
+    elseif slot and Profiles.slots and Profiles.slots[slot] ~= "" then
         Profiles.Switch(Profiles.slots[slot])
     elseif id == "new_profile" then
-        Profiles.NewPlayer()
+        local box = name_box(wnd)
+        Profiles.NewPlayer(box and S(box.GetText()))
+        if box then
+            box.SetText("")
+        end
     elseif id == "show_records" then
         Profiles.OpenRecords()
         return true
@@ -188,6 +214,7 @@ function ProfilesWnd.OnChildAction(wnd, action, sender)
         if not Profiles.Current() then
             Profiles.NewPlayer()
         end
+        Profiles.typing = false
         close(wnd)
         return true
     end
@@ -231,7 +258,7 @@ end
 if DemoWindow.OnKeyDown ~= Profiles.on_key then
     local base_key = DemoWindow.OnKeyDown
     Profiles.on_key = function(self, key, mods, raw, broadcast)
-        if not broadcast and keys[key] then
+        if not broadcast and keys[key] and not Profiles.typing then
             keys[key]()
             return true
         end

@@ -10,10 +10,12 @@
 #include "gui/WidgetManager.h"
 #include "gui/controls/ControlSupport.h"
 #include "gui/controls/ImageWidget.h"
+#include "gui/controls/ScrollWidget.h"
 #include "misc/CharClass.h"
 
 #include <algorithm>
 #include <climits>
+#include <cmath>
 
 namespace ox::gui {
 
@@ -48,6 +50,23 @@ bool IsWordStop(wchar c) { return IsPunctuation(c) || misc::IsBreakSpace(c) || c
 
 bool IsHighSurrogate(wchar c) { return c >= 0xD800 && c <= 0xDBFF; }
 
+// A missing bar counts 0 in value and in size.
+float ValueOf(const CScrollWidget* bar) { return bar ? bar->GetValue() : 0.0f; }
+float WidthOf(const CWidget* bar) { return bar ? bar->GetSize().X : 0.0f; }
+float HeightOf(const CWidget* bar) { return bar ? bar->GetSize().Y : 0.0f; }
+
+// Moves a bar's value by `delta`, or to 0; true when the value changed.
+bool Shift(CScrollWidget* bar, bool toStart, int delta)
+{
+    if (!bar || (!toStart && delta == 0))
+        return false;
+    const float old = bar->GetValue();
+    const float wanted = toStart ? 0.0f : old + static_cast<float>(delta);
+    if (wanted != old)
+        bar->SetValue(wanted);
+    return bar->GetValue() != old;
+}
+
 } // namespace
 
 const wchar* CEditWidget::s_ForbiddenSymbols = u"";
@@ -78,6 +97,8 @@ void CEditWidget::SetForbiddenSymbols(const wchar* _symbols)
 }
 
 CWidget* CEditWidget::GetCursorWidget() const { return m_CursorImage.get(); }
+CScrollWidget* CEditWidget::GetHorzScroll() const { return static_cast<CScrollWidget*>(m_HorzScroll.get()); }
+CScrollWidget* CEditWidget::GetVertScroll() const { return static_cast<CScrollWidget*>(m_VertScroll.get()); }
 
 // Loading ---------------------------------------------------------------------------------
 
@@ -115,11 +136,83 @@ void CEditWidget::Load(const core::CSettingsGroup& node, const core::CSettingsGr
     bool multiline = false;
     if (ReadFlag(node, "multiline", multiline))
         SetMultiline(multiline);
+    bool horizontal = false, vertical = false;
+    if (ReadFlag(node, "horz_scroll", horizontal) && horizontal && !m_HorzScroll)
+        m_HorzScroll = MakeScrollBar(false, tmpl.GetChild("horizontal_scroll"), templates);
+    if (ReadFlag(node, "vert_scroll", vertical) && vertical && !m_VertScroll)
+        m_VertScroll = MakeScrollBar(true, tmpl.GetChild("vertical_scroll"), templates);
     CWidget::Load(node, templates);
     const FloatVector preferred = GetPreferredSize();
     SetSize(std::max(preferred.X, GetSize().X), std::max(preferred.Y, GetSize().Y));
+    RefitScrollBars();
     MoveCursor(0, true);
     m_CursorImage->AddFlags(FlagHidden);
+}
+
+WidgetPtrT CEditWidget::MakeScrollBar(bool vertical, const core::CSettingsGroup& node,
+                                      const core::CSettingsGroup& templates)
+{
+    auto* bar = new CScrollWidget(vertical);
+    WidgetPtrT held(bar);
+    bar->SetImages("", "", "", "");
+    bar->Load(node, templates);
+    bar->SetValue(0);
+    bar->SetButtonValue(20);
+    bar->SetAnchors(vertical ? AnchorRight | AnchorTop | AnchorBottom : AnchorLeft | AnchorRight | AnchorBottom);
+    AddWidget(held);
+    return held;
+}
+
+void CEditWidget::PlaceScrollBars()
+{
+    CWidget* horizontal = m_HorzScroll.get();
+    CWidget* vertical = m_VertScroll.get();
+    const FloatVector size = GetSize();
+    const float barWidth = WidthOf(vertical), barHeight = HeightOf(horizontal);
+    if (vertical) {
+        vertical->SetOffset(size.X - barWidth, 0);
+        vertical->SetSize(barWidth, std::max(0.0f, size.Y - barHeight));
+    }
+    if (horizontal) {
+        horizontal->SetOffset(0, size.Y - barHeight);
+        horizontal->SetSize(std::max(0.0f, size.X - barWidth), barHeight);
+    }
+}
+
+void CEditWidget::RefitScrollBars()
+{
+    CScrollWidget* bars[] = {GetHorzScroll(), GetVertScroll()};
+    misc::IntVector text;
+    const misc::IntRect box = TextRect();
+    if (!m_Font || !(bars[0] || bars[1]) ||
+        !Measurer().GetTextSize(m_Font, m_Text.c_str(), box, TextFlags(), 0, text))
+        return;
+    const int whole[] = {text.X, text.Y}, page[] = {box.Width, box.Height};
+    for (int i = 0; i < 2; ++i) {
+        if (!bars[i])
+            continue;
+        const float value = bars[i]->GetValue();
+        bars[i]->SetMaxValue(static_cast<float>(whole[i]));
+        bars[i]->SetPageSize(static_cast<float>(page[i]));
+        if (bars[i]->GetValue() != value)
+            bars[i]->SetValue(value);
+    }
+}
+
+bool CEditWidget::ScrollIntoView(const misc::IntRect& rect)
+{
+    const misc::IntRect box = TextRect();
+    const int left = static_cast<int>(m_TextInsets.Left), top = static_cast<int>(m_TextInsets.Top);
+    auto overflow = [](int start, int size, int visibleStart, int visibleSize) {
+        if (start < visibleStart)
+            return start - visibleStart;
+        return std::max(0, start + size - (visibleStart + visibleSize));
+    };
+    const bool horizontal =
+        Shift(GetHorzScroll(), m_CursorPos == 0, overflow(rect.X, rect.Width, left, box.Width));
+    const bool vertical =
+        Shift(GetVertScroll(), m_CursorPos == 0, overflow(rect.Y, rect.Height, top, box.Height));
+    return horizontal || vertical;
 }
 
 misc::FloatVector CEditWidget::GetPreferredSize() const
@@ -137,6 +230,8 @@ void CEditWidget::SetSize(float width, float height)
 {
     CWidget::SetSize(width, height);
     m_BackImage->SetSize(width, height);
+    PlaceScrollBars();
+    RefitScrollBars();
     MoveCursor(m_CursorPos, true);
 }
 
@@ -185,6 +280,8 @@ void CEditWidget::SetText(const wstring& text)
     m_SelectionStart = std::min(m_SelectionStart, length);
     m_SelectionEnd = std::min(m_SelectionEnd, length);
     m_History.Push(m_Text);
+    // The bars take the new text's size first, so that the caret can be scrolled to.
+    RefitScrollBars();
     MoveCursor(m_CursorPos, true);
     // A parent that sets the text again while it hears of a change hears no more of it.
     if (m_Notifying)
@@ -199,9 +296,11 @@ void CEditWidget::OnTextChanged() { TellParent(*this, "text_changed"); }
 misc::IntRect CEditWidget::TextRect() const
 {
     const misc::FloatInsets& in = m_TextInsets;
-    return misc::IntRect(static_cast<int>(in.Left), static_cast<int>(in.Top),
-                         std::max(0, static_cast<int>(GetSize().X - in.Left - in.Right)),
-                         std::max(0, static_cast<int>(GetSize().Y - in.Top - in.Bottom)));
+    const CWidget *horizontal = m_HorzScroll.get(), *vertical = m_VertScroll.get();
+    return misc::IntRect(static_cast<int>(std::lround(in.Left - ValueOf(GetHorzScroll()))),
+                         static_cast<int>(std::lround(in.Top - ValueOf(GetVertScroll()))),
+                         std::max(0, static_cast<int>(GetSize().X - in.Left - in.Right - WidthOf(vertical))),
+                         std::max(0, static_cast<int>(GetSize().Y - in.Top - in.Bottom - HeightOf(horizontal))));
 }
 
 bool CEditWidget::CaretCharRect(int position, misc::IntRect& rect, bool& lineStart)
@@ -228,7 +327,7 @@ bool CEditWidget::CaretCharRect(int position, misc::IntRect& rect, bool& lineSta
                                   static_cast<unsigned>(text->size()), q, rect);
 }
 
-void CEditWidget::MoveCursor(int index, bool /*scrollIntoView*/)
+void CEditWidget::MoveCursor(int index, bool scrollIntoView)
 {
     m_CursorPos = std::clamp(index, 0, static_cast<int>(m_Text.size()));
     CWidget& caret = *m_CursorImage;
@@ -240,6 +339,8 @@ void CEditWidget::MoveCursor(int index, bool /*scrollIntoView*/)
     }
     // Only a text of characters the font lacks has no rectangle.
     OX_CHECK_DATA(CaretCharRect(m_CursorPos, rect, lineStart), caret.SetOffset(TextRect().X, TextRect().Y));
+    if (scrollIntoView && ScrollIntoView(rect))
+        CaretCharRect(m_CursorPos, rect, lineStart);
     const int x = (m_CursorPos == 0 || lineStart) ? rect.X : rect.X + rect.Width;
     const FloatVector size = caret.GetSize();
     caret.SetOffset(static_cast<float>(x) - size.X / 2,
@@ -565,6 +666,13 @@ bool CEditWidget::OnMouseUp(const IntVector& pos, MouseButtons button, int keys,
     return handled;
 }
 
+void CEditWidget::OnChildAction(const std::string& action, CWidget* sender)
+{
+    CWidget::OnChildAction(action, sender);
+    if (action == "value_changed" && sender && (sender == m_HorzScroll.get() || sender == m_VertScroll.get()))
+        MoveCursor(m_CursorPos, false);
+}
+
 void CEditWidget::SetFocused(bool focused)
 {
     CWidget::SetFocused(focused);
@@ -589,6 +697,7 @@ void CEditWidget::DoDraw(graphics::CRenderer& renderer)
     CWidget::DoDraw(renderer);
     const misc::IntRect box = TextRect();
     renderer.PushState();
+    // The text shows within the insets and the bars.
     renderer.SetClipPoly(misc::RectToPoly4({m_TextInsets.Left, m_TextInsets.Top, static_cast<float>(box.Width),
                                             static_cast<float>(box.Height)}));
     const graphics::Color none(0u);

@@ -16,6 +16,7 @@ struct CFont;
 namespace ox::gui {
 
 class CImageWidget;
+class CScrollWidget;
 
 class CEditWidget : public CWidget {
 public:
@@ -26,8 +27,8 @@ public:
     ~CEditWidget() override;
 
     // The edit_template's font, justification, colours, insets, caret and back images; the
-    // element's text, max_chars and multiline. The size grows to hold the back image and one
-    // line of text within the insets.
+    // element's text, max_chars and multiline, and the scroll bars it asks for. The size
+    // grows to hold the back image and one line of text within the insets.
     void Load(const core::CSettingsGroup& node, const core::CSettingsGroup& templates) override;
     FloatVector GetPreferredSize() const override;
     void SetSize(float width, float height) override;
@@ -38,6 +39,8 @@ public:
     bool OnMouseDown(const IntVector& pos, MouseButtons button, int keys, bool broadcast) override;
     bool OnMouseMove(const IntVector& pos, int keys, bool broadcast) override;
     bool OnMouseUp(const IntVector& pos, MouseButtons button, int keys, bool broadcast) override;
+    // A scrolled bar takes the caret along with the text.
+    void OnChildAction(const std::string& action, CWidget* sender) override;
     // The caret shows only with the focus; losing it collapses the selection.
     void SetFocused(bool focused) override;
 
@@ -66,6 +69,9 @@ public:
     bool CanRedo() const { return m_History.CanRedo(); }
     // The caret's place in the widget and whether it shows.
     CWidget* GetCursorWidget() const;
+    // The scroll bars the element asked for, or null.
+    CScrollWidget* GetHorzScroll() const;
+    CScrollWidget* GetVertScroll() const;
 
     // Tells the parent "text_changed".
     virtual void OnTextChanged();
@@ -75,8 +81,15 @@ public:
     static void SetClipboardEnabled(bool enabled) { s_ClipboardEnabled = enabled; }
 
 private:
-    // The box the text is laid out in, in the widget's coordinates.
+    // The box the text is laid out in, in the widget's coordinates: within the insets and
+    // the bars, moved by the bars' values.
     misc::IntRect TextRect() const;
+    // The bars' places along the edges, and their range after the text changed.
+    void PlaceScrollBars();
+    void RefitScrollBars();
+    // Scrolls so that a character's rectangle lies within the visible text; true if a value changed.
+    bool ScrollIntoView(const misc::IntRect& rect);
+    WidgetPtrT MakeScrollBar(bool vertical, const core::CSettingsGroup& node, const core::CSettingsGroup& templates);
     unsigned TextFlags() const { return m_HorzFlags | m_VertFlags; }
     // The rectangle of the character the caret stands behind (or before, at 0 and at the
     // start of a line); false when the text renderer finds none.
@@ -110,6 +123,8 @@ private:
     graphics::Color m_Colors[ColorCount];
     WidgetPtrT m_BackImage;
     WidgetPtrT m_CursorImage;
+    WidgetPtrT m_HorzScroll;
+    WidgetPtrT m_VertScroll;
     bool m_Multiline = false;
     int m_CursorPos = 0;
     int m_SelectionStart = 0;

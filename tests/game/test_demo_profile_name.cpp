@@ -1,0 +1,118 @@
+// The demo's players' chooser in the real game, headless: a new player's name typed into its
+// edit widget through the platform's events (typed, a character taken back, a paste from the
+// clipboard, a slip undone) while the first window's letter keys stay letters, then "New
+// player" makes that player the current one.
+#include "DemoChild.h"
+#include "core/platform/StandaloneApplicationSdl.h"
+#include "game/App.h"
+#include "game/Profile.h"
+#include "gui/Window.h"
+#include "gui/controls/EditWidget.h"
+#include "lua/Lua.h"
+#include "lua/LuaTestHost.h"
+#include "misc/Unicode.h"
+
+#include <SDL.h>
+
+#include <cstring>
+#include <fstream>
+
+using namespace ox;
+
+namespace {
+
+std::string g_Out;
+
+void PushText(const char* text)
+{
+    SDL_Event event {};
+    event.type = SDL_TEXTINPUT;
+    strncpy(event.text.text, text, sizeof(event.text.text) - 1);
+    SDL_PushEvent(&event);
+}
+
+void PushKey(SDL_Keycode key, SDL_Scancode scancode, uint16_t modifiers)
+{
+    for (Uint32 type : {SDL_KEYDOWN, SDL_KEYUP}) {
+        SDL_Event event {};
+        event.type = type;
+        event.key.state = type == SDL_KEYDOWN ? SDL_PRESSED : SDL_RELEASED;
+        event.key.keysym.sym = key;
+        event.key.keysym.scancode = scancode;
+        event.key.keysym.mod = modifiers;
+        SDL_PushEvent(&event);
+    }
+}
+
+// Runs the game to its main menu, opens the chooser from it and types "Rob" as a player
+// would; writes the box's text after each step, then the current player's name.
+int TypeAName()
+{
+    k17::CApp app;
+    app.ReadGameFolder();
+    if (!app.Init())
+        return 10;
+    gui::BaseWindowPtrT loading = app.CreateLoadWindow();
+    app.SetMainWindow(loading);
+    auto* adapter = dynamic_cast<core::CStandaloneApplicationSdl*>(app.GetSystemIntegration());
+    if (!adapter)
+        return 11;
+    auto frame = [&] {
+        adapter->PumpMessages();
+        app.Update();
+        app.Draw();
+    };
+    auto top = [&app](const char* id) { return app.GetTopWindow() && app.GetTopWindow()->GetId() == id; };
+    for (int i = 0; i < 300 && !top("main_menu"); ++i)
+        frame();
+    lua::CLua* mainLua = lua::CLua::GetLua("main");
+    if (!mainLua || !top("main_menu"))
+        return 12;
+    oxtest::RunChunk(mainLua->GetLuaState(), "local menu = g_Application.GetTopWindow()"
+                                             " MainMenu.OnChildAction(menu, 'pressed', menu.GetWidget('profiles', true))");
+    frame();
+    auto* edit = dynamic_cast<gui::CEditWidget*>(app.GetTopWindow()->GetWidget("new_name", true));
+    if (!top("profiles") || !edit || !oxtest::PressWidget(app.GetTopWindow(), "new_name"))
+        return 13;
+    std::ofstream out(g_Out);
+    auto step = [&](auto&& push) {
+        push();
+        frame();
+        out << misc::WideToUtf8(edit->GetText()) << "|";
+    };
+    // R is also the first window's key for the records: in the box it is a letter.
+    step([] {
+        PushKey(SDLK_r, SDL_SCANCODE_R, KMOD_LSHIFT);
+        PushText("Rx");
+    });
+    step([] { PushKey(SDLK_BACKSPACE, SDL_SCANCODE_BACKSPACE, KMOD_NONE); });
+    step([] {
+        SDL_SetClipboardText("ob");
+        PushKey(SDLK_v, SDL_SCANCODE_V, KMOD_LCTRL);
+    });
+    step([] { PushText("!z"); }); // the '!' is no character of a name
+    step([] { PushKey(SDLK_z, SDL_SCANCODE_Z, KMOD_LCTRL); });
+    if (!oxtest::PressWidget(app.GetTopWindow(), "new_profile"))
+        return 14;
+    frame();
+    k17::CProfile* current = k17::g_ProfileManager::Instance().GetCurrentProfile();
+    out << (current ? misc::WideToUtf8(current->GetName()) : std::string("nobody")) << "|"
+        << misc::WideToUtf8(edit->GetText());
+    out.close();
+    app.Stop();
+    loading.reset();
+    app.DoShutdown();
+    return 0;
+}
+
+} // namespace
+
+TEST(DemoProfileName, ANewPlayersNameIsTypedEditedPastedAndUndone)
+{
+    oxtest::DemoChild demo;
+    g_Out = (demo.dir / "result.txt").string();
+    ASSERT_EQ(demo.Run(&TypeAName), 0) << demo.Output() << demo.Errors();
+    EXPECT_EQ(oxtest::ReadFile(g_Out), "Rx|R|Rob|Robz|Rob|Rob|");
+    EXPECT_NE(demo.Output().find("Lantern Demo: new player Rob"), std::string::npos) << demo.Output();
+    EXPECT_EQ(demo.Errors().find("Lua Error"), std::string::npos) << demo.Errors();
+}

@@ -1,0 +1,91 @@
+// The font viewer of game makers on the demo's fonts, headless: the combo box lists the
+// declared fonts, the label shows the typed text in the chosen one, a font file saved again
+// rebuilds the label, and Escape closes the window.
+#include "DemoChild.h"
+#include "core/FontManager.h"
+#include "core/platform/StandaloneApplicationSdl.h"
+#include "game/App.h"
+#include "game/FontViewerWindow.h"
+#include "gui/WidgetManager.h"
+#include "gui/controls/ComboBoxWidget.h"
+#include "gui/controls/EditWidget.h"
+#include "gui/controls/LabelWidget.h"
+#include "misc/Unicode.h"
+
+#include <chrono>
+#include <fstream>
+#include <thread>
+
+using namespace ox;
+
+namespace {
+
+std::string g_Out;
+
+int ViewFonts()
+{
+    k17::CApp app;
+    app.ReadGameFolder();
+    if (!app.Init())
+        return 10;
+    gui::BaseWindowPtrT loading = app.CreateLoadWindow();
+    app.SetMainWindow(loading);
+    auto* adapter = dynamic_cast<core::CStandaloneApplicationSdl*>(app.GetSystemIntegration());
+    if (!adapter)
+        return 11;
+    auto frame = [&] {
+        adapter->PumpMessages();
+        app.Update();
+        app.Draw();
+    };
+    for (int i = 0; i < 300 && !(app.GetTopWindow() && app.GetTopWindow()->GetId() == "main_menu"); ++i)
+        frame();
+    const core::CSettings& settings = app.GetSettings();
+    boost::intrusive_ptr<k17::CFontViewerWindow> viewer(new k17::CFontViewerWindow());
+    viewer->Load(settings.GetChildByAttribute("window", "id", "font_viewer", true), settings.GetChild("GUITemplates"));
+    viewer->UpdateLayout();
+    app.GetTopWindow()->AddChildWindow(viewer);
+    frame();
+    auto* fonts = dynamic_cast<gui::CComboBoxWidget*>(viewer->GetWidget("combobox_fonts", true));
+    auto* edit = dynamic_cast<gui::CEditWidget*>(viewer->GetWidget("edit_text", true));
+    auto label = [&] { return dynamic_cast<gui::CLabelWidget*>(viewer->GetWidget("label_text", true)); };
+    if (!fonts || !edit || !label())
+        return 12;
+    auto font = [&](const char* id) { return label()->GetFont() == core::CFontManager::Instance().GetItem(id); };
+    std::ofstream out(g_Out);
+    out << viewer->GetFontCount() << " " << misc::WideToUtf8(fonts->GetLine(0)) << " "
+        << misc::WideToUtf8(fonts->GetLine(1)) << "|" << misc::WideToUtf8(label()->GetText()) << " " << font("small");
+    edit->SetText(u"Abc");
+    out << "|" << misc::WideToUtf8(label()->GetText());
+    fonts->SelectLine(1, true);
+    frame();
+    const gui::CWidget* titled = label();
+    out << "|" << misc::WideToUtf8(label()->GetText()) << " " << font("title") << " "
+        << (label()->GetOffset().Y >= edit->GetAbsPos(false).Y + edit->GetSize().Y);
+    // The title font's file saved again: the label is built anew.
+    std::filesystem::last_write_time("fonts/title.xml",
+                                     std::filesystem::last_write_time("fonts/title.xml") + std::chrono::seconds(5));
+    std::this_thread::sleep_for(std::chrono::milliseconds(1100));
+    frame();
+    frame();
+    out << "|" << (label() != titled) << " " << font("title");
+    viewer->OnKeyDown(gui::OX_ESC, 0, 0, false);
+    frame();
+    out << "|" << app.GetTopWindow()->GetId();
+    out.close();
+    viewer.reset();
+    app.Stop();
+    loading.reset();
+    app.DoShutdown();
+    return 0;
+}
+
+} // namespace
+
+TEST(FontViewer, ListsTheFontsShowsTheTextFollowsItsFilesAndClosesOnEscape)
+{
+    oxtest::DemoChild demo;
+    g_Out = (demo.dir / "result.txt").string();
+    ASSERT_EQ(demo.Run(&ViewFonts), 0) << demo.Output() << demo.Errors();
+    EXPECT_EQ(oxtest::ReadFile(g_Out), "2 small title|Lantern Demo 1|Abc|Abc 1 1|1 1|main_menu");
+}
