@@ -12,6 +12,8 @@
 #include "gui/controls/ScrollWidget.h"
 #include "gui/controls/ToolbarWidget.h"
 #include "gui/controls/TabWidget.h"
+#include "gui/controls/TableWidget.h"
+#include "gui/controls/TreeWidget.h"
 
 namespace ox::gui {
 
@@ -71,6 +73,8 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CToolbarWidget>("toolbar_widget");
     factory.RegisterWidget<CScrollWidget>("scroll_widget");
     factory.RegisterWidget<CTabWidget>("tab_widget");
+    factory.RegisterWidget<CTableWidget>("table_widget");
+    factory.RegisterWidget<CTreeWidget>("tree_widget");
 }
 
 } // namespace ox::gui
