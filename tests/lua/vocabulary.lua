@@ -193,6 +193,18 @@ V.controls = {
         ["ox.gui.CToolTipHelperWidget"] = { "StopShowToolTip" },
         ["ox.gui.CScrollWidget"] = { "SetValue", "GetValue", "SetMaxValue", "GetMaxValue", "SetPageSize",
                                      "GetPageSize", "OnValueChanged", "SetButtonValue" },
+        ["ox.gui.CComboBoxWidget"] = { "ClearLines", "EnumLines", "AddLine", "GetLine", "FindLine", "SetLine",
+                                       "RemoveLine", "SelectLine", "GetSelectedLine", "ShowList" },
+        ["ox.gui.CListWidget"] = {
+            "CalcHeightToFitLines", "SetListHeight", "EnumLines", "ClearLines", "AddLine", "GetLine", "FindLine",
+            "SetLine", "RemoveLine", "SelectLine", "GetSelectedLine", "GetScrollWidth", "SetLineJustifications",
+            "SetListColors", "OnLineSelected",
+            constants = { ListColorTextNormal = 0, ListColorTextSelected = 1, ListColorTextOver = 2,
+                          ListColorSelection = 3 },
+        },
+        ["ox.gui.CSliderWidget"] = { "SetValue", "GetValue", "OnValueChanged" },
+        ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
+                                   "SetMaxChars", "OnTextChanged" },
         ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
         ["ox.gui.CTableWidget"] = { "GetCell", "LoadRow", "FitCells", "GetCellsCount", "ClearTable", "SelectRow",
                                     "GetSelectedRow" },
@@ -228,18 +240,6 @@ V.pending = {
     },
     widgets = {
         classes = {
-            ["ox.gui.CComboBoxWidget"] = { "ClearLines", "EnumLines", "AddLine", "GetLine", "FindLine", "SetLine",
-                                           "RemoveLine", "SelectLine", "GetSelectedLine", "ShowList" },
-            ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
-                                       "SetMaxChars", "OnTextChanged" },
-            ["ox.gui.CListWidget"] = {
-                "CalcHeightToFitLines", "SetListHeight", "EnumLines", "ClearLines", "AddLine", "GetLine", "FindLine",
-                "SetLine", "RemoveLine", "SelectLine", "GetSelectedLine", "GetScrollWidth", "SetLineJustifications",
-                "SetListColors", "OnLineSelected",
-                constants = { ListColorTextNormal = 0, ListColorTextSelected = 1, ListColorTextOver = 2,
-                              ListColorSelection = 3 },
-            },
-            ["ox.gui.CSliderWidget"] = { "SetValue", "GetValue", "OnValueChanged" },
         },
     },
 }
