@@ -19,6 +19,7 @@ using namespace ox::gui;
 using ox::misc::FloatVector;
 using oxtest::ActionWindow;
 using Strings = std::vector<std::string>;
+using ox::graphics::Vertex;
 
 namespace {
 
@@ -319,6 +320,12 @@ TEST_F(TreeTest, DraggingMovesANodeOnlyWhereItWouldChangePlace)
     EXPECT_EQ(Children(g), "c b");
     EXPECT_FALSE(tree->MoveNode(*b, d, nullptr)) << "into its own child";
     EXPECT_EQ(Children(g), "c b");
+    // Cleared, a node a script holds stays, outside any tree.
+    CTreeWidget::NodePtrT kept(c);
+    tree->Clear();
+    EXPECT_EQ(tree->GetFirstNode(), nullptr);
+    EXPECT_EQ(kept->GetParent(), nullptr);
+    EXPECT_EQ(kept->GetNextSibling(), nullptr);
 }
 
 // Tables -----------------------------------------------------------------------------------------
@@ -407,6 +414,33 @@ TEST_F(CompositeTest, TableScrollsUnderItsTitleAndSelectsRows)
     EXPECT_GT(scroll.GetValue(), 20.0f);
 }
 
+TEST_F(TreeTest, RowsDrawTheirExpandBoxAndSelection)
+{
+    ShowTree();
+    Node* g = Add("g", nullptr, true);
+    Add("a", g);
+    Add("b")->RaiseFlag(Node::FlagSelected);
+    // The expand box's frame: the closed one (u from 0.5) while closed with children, then
+    // the open one. The selected row fills behind its text with the selection colour.
+    auto boxU = [&]() {
+        Draws();
+        tree->Draw(*renderer);
+        float u = 2;
+        bool filled = false;
+        for (const auto& draw : Draws())
+            for (const Vertex& v : draw.vertices) {
+                if (v.x < 113 && v.y < 69 && draw.texture)
+                    u = std::min(u, v.u);
+                filled = filled || v.diffuse == 0xFF0000FFu;
+            }
+        EXPECT_TRUE(filled);
+        return u;
+    };
+    EXPECT_FLOAT_EQ(boxU(), 0.5f);
+    g->RaiseFlag(Node::FlagExpanded);
+    EXPECT_FLOAT_EQ(boxU(), 0.0f);
+}
+
 TEST_F(TreeTest, ScriptsBuildTheTreeAndAFailingHandlerLeavesItUsable)
 {
     oxtest::MessageCapture boxes;
@@ -438,4 +472,65 @@ TEST_F(TreeTest, ScriptsBuildTheTreeAndAFailingHandlerLeavesItUsable)
     tree->SetEventHandler(&lua, "");
     Click(100 + 5, RowY(0));
     EXPECT_EQ(Selected(), "") << "closed";
+}
+
+// The demo's developer window: its description and scripts/devtools.lua over a level of two
+// scenes, the window's own boxes standing in as plain widgets.
+TEST_F(TreeTest, DemoDeveloperWindowShowsTheLevelAndRefusesMoves)
+{
+    oxtest::ScopedKind box {"demo_box_widget", oxtest::ScopedKind::Of<CWidget>()};
+    oxtest::MessageCapture boxes;
+    GetGuiServices().findFont = [this](const char*) { return &font; };
+    ox::core::CSettings settings;
+    ASSERT_TRUE(settings.LoadXml(OX_DEMO_GAME "/properties/guitemplates.xml"));
+    ASSERT_TRUE(settings.LoadXml(OX_DEMO_GAME "/properties/gui.xml"));
+    window = new ActionWindow();
+    window->Load(settings.GetChildByAttribute("window", "id", "devtools", true), settings.GetChild("GUITemplates"));
+    window->UpdateLayout();
+    manager.SetMainWindow(window);
+    manager.Update();
+    tree = &Get<CTreeWidget>("devtools_tree");
+
+    ox::lua::CLua lua {"main", false};
+    lua.BeginBinding();
+    lua.Bind(mluabind::BindStdStrings());
+    lua.Bind(mluabind::Namespace("ox").Merge(ox::lua::BindLuaClasses()).Merge(BindGui()));
+    lua.EndBinding();
+    ASSERT_TRUE(lua.Run(std::string(R"(
+        DemoWindow = { OnKeyDown = function() return false end }
+        qe = { CBaseSceneObject = { GroupType = 2 } }
+        local function list(items)
+            local i = 1
+            return { IsEnd = function() return i > #items end, Get = function() return items[i] end,
+                     Next = function() i = i + 1 end }
+        end
+        local function object(id, kind) return { GetId = function() return id end, GetType = function() return kind end } end
+        local function scene(id, objects)
+            return { GetId = function() return id end, GetObjects = function() return list(objects) end }
+        end
+        lantern = { level = { GetId = function() return "level1" end, EnumScenes = function() return 2 end,
+                              GetScenes = function() return list({ scene("hall", { object("lamp", 1), object("shelf", 2) }),
+                                                                   scene("attic", { object("key", 1) }) }) end } })")));
+    ASSERT_TRUE(lua.Run(oxtest::ReadFile(OX_DEMO_GAME "/scripts/devtools.lua")));
+    EXPECT_EQ((ox::lua::CallLuaFunction<int>(lua, "DevTools.Fill", tree)), 3);
+    Node* level = tree->GetFirstNode();
+    ASSERT_NE(level, nullptr);
+    EXPECT_EQ(Text(level), "level1");
+    EXPECT_EQ(Children(level), "hall attic");
+    EXPECT_EQ(Children(level->GetFirstChild()), "lamp shelf [group]");
+
+    // Open the hall; its lamp can't be dragged into the attic: the script refuses.
+    level->GetFirstChild()->RaiseFlag(Node::FlagExpanded);
+    tree->UpdateNodes();
+    const ox::misc::FloatVector at = tree->GetAbsPos(false);
+    const int x = static_cast<int>(at.X) + 4 + 2 * 14 + 6, rowHeight = static_cast<int>(font.PixHeight);
+    auto rowY = [&](int row) { return static_cast<int>(at.Y) + 4 + row * rowHeight + rowHeight / 2; };
+    Move(x, rowY(2));
+    Down(x, rowY(2));
+    ASSERT_TRUE(tree->IsDragging());
+    Move(x - 14, rowY(4));
+    EXPECT_EQ(tree->GetDragTarget(), nullptr);
+    Up(x - 14, rowY(4));
+    EXPECT_EQ(Children(level->GetFirstChild()), "lamp shelf [group]");
+    EXPECT_TRUE(boxes.Boxes().empty());
 }

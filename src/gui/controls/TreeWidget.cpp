@@ -21,9 +21,15 @@ using Node = CTreeWidget::CNode;
 
 CTreeWidget::CNode::~CNode()
 {
-    NodePtrT next = std::move(m_NextSibling);
-    while (next && next->GetRefCount() == 1)
-        next = std::move(next->m_NextSibling);
+    // The children one by one: each is cut from the chain before it goes, so that a long
+    // chain never recurses, and one a script still holds is left outside any tree.
+    NodePtrT child = std::move(m_FirstChild);
+    while (child) {
+        NodePtrT next = std::move(child->m_NextSibling);
+        child->m_Parent = nullptr;
+        child->m_PrevSibling = nullptr;
+        child = std::move(next);
+    }
 }
 
 Node* CTreeWidget::CNode::GetLastChild() const
@@ -569,7 +575,8 @@ bool CTreeWidget::OnMouseDown(const IntVector& pos, MouseButtons button, int key
         return true;
     }
     NodePtrT held(node);
-    if (x < rect.X + m_Offset + IconWidth(*node) && Fire(EventIconClicked, *node))
+    const float iconStart = rect.X + m_Offset;
+    if (x >= iconStart && x < iconStart + IconWidth(*node) && Fire(EventIconClicked, *node))
         return true;
     if ((keys & ShiftPressed) && m_LastClicked && m_LastClicked != node && m_LastClicked->m_Parent == node->m_Parent &&
         node->m_Parent)

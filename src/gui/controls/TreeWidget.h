@@ -34,7 +34,7 @@ public:
     public:
         enum Flags : uint32_t { FlagSelected = 1, FlagExpanded = 2, FlagGroup = 4 };
 
-        // Unlinks the chain of following siblings one by one: a long chain never recurses.
+        // Lets the children go one by one: a long chain of siblings never recurses.
         ~CNode() override;
 
         graphics::CImage& GetIcon() { return m_Icon; }
