@@ -10,6 +10,9 @@
 #include "gui/LayoutBox.h"
 #include "gui/WidgetFactory.h"
 #include "gui/WidgetManager.h"
+#include "gui/controls/ScrollWidget.h"
+#include "gui/controls/TableWidget.h"
+#include "gui/controls/TreeWidget.h"
 #include "gui/Window.h"
 
 #include <benchmark/benchmark.h>
@@ -275,31 +278,62 @@ std::string MenuDescription(int count)
 
 } // namespace
 
+namespace {
+
+// The mono font of MenuFontXml and one strip texture that every image id finds, set as the
+// GUI's look-ups for the length of a benchmark.
+struct GuiAssets {
+    ox::graphics::CSurface glyphSurface {256, 64}, stripSurface {256, 16};
+    ox::graphics::CTexture glyphs {&glyphSurface}, strip {&stripSurface};
+    ox::graphics::FontBlock block;
+    ox::graphics::CFont font;
+    bool ready = false;
+
+    GuiAssets()
+    {
+        const std::string fontXml = MenuFontXml();
+        if (!ox::graphics::BuildFontBlock(fontXml.data(), fontXml.size(), "mono", "mono.xml", &glyphs, block))
+            return;
+        font.Attach(block.data());
+        font.Texture = &glyphs;
+        GetGuiServices().findFont = [this](const char*) { return &font; };
+        ox::graphics::CImage::SetTextureLookup([this](const char*) { return &strip; });
+        RegisterFrameworkWidgets(GetWidgetFactory());
+        ready = true;
+    }
+    ~GuiAssets()
+    {
+        GetGuiServices().findFont = nullptr;
+        ox::graphics::CImage::SetTextureLookup(nullptr);
+    }
+    GuiAssets(const GuiAssets&) = delete;
+    GuiAssets& operator=(const GuiAssets&) = delete;
+};
+
+// The description's first widget element, loaded with its templates.
+template <class W>
+boost::intrusive_ptr<W> LoadDescription(const std::string& xml, ox::core::CSettings& settings)
+{
+    settings.LoadXmlFromMemory(xml.data(), xml.size(), "bench.xml");
+    boost::intrusive_ptr<W> widget(new W());
+    widget->Load(settings.GetFirstChild().GetFirstChild(), settings.GetFirstChild().GetChild("GUITemplates"));
+    return widget;
+}
+
+} // namespace
+
 // One frame of a menu window of 200 controls (labels with text, buttons with images and
 // labels): the update walk, then the draw walk with the text laid out.
 static void BM_MenuFrame(benchmark::State& state)
 {
     Frame frame;
-    ox::graphics::CSurface glyphSurface(256, 64), stripSurface(256, 16);
-    ox::graphics::CTexture glyphs(&glyphSurface), strip(&stripSurface);
-    const std::string fontXml = MenuFontXml();
-    ox::graphics::FontBlock block;
-    ox::graphics::CFont font;
-    if (!ox::graphics::BuildFontBlock(fontXml.data(), fontXml.size(), "mono", "mono.xml", &glyphs, block)) {
+    GuiAssets assets;
+    if (!assets.ready) {
         state.SkipWithError("the font cannot be built");
         return;
     }
-    font.Attach(block.data());
-    font.Texture = &glyphs;
-    GetGuiServices().findFont = [&font](const char*) { return &font; };
-    ox::graphics::CImage::SetTextureLookup([&strip](const char*) { return &strip; });
-    RegisterFrameworkWidgets(GetWidgetFactory());
-
-    const std::string xml = MenuDescription(static_cast<int>(state.range(0)));
     ox::core::CSettings settings;
-    settings.LoadXmlFromMemory(xml.data(), xml.size(), "menu.xml");
-    boost::intrusive_ptr<CWindow> window(new CWindow());
-    window->Load(settings.GetFirstChild().GetChild("window"), settings.GetFirstChild().GetChild("GUITemplates"));
+    auto window = LoadDescription<CWindow>(MenuDescription(static_cast<int>(state.range(0))), settings);
     window->UpdateLayout();
     // The rows are bare boxes: the controls are the window's children.
     const double controls = static_cast<double>(window->GetWidgets().size());
@@ -309,13 +343,90 @@ static void BM_MenuFrame(benchmark::State& state)
         window->Draw(frame.renderer);
         frame.renderer.EndScene();
     }
-    GetGuiServices().findFont = nullptr;
-    ox::graphics::CImage::SetTextureLookup(nullptr);
     state.SetItemsProcessed(state.iterations());
     state.counters["controls"] = controls;
     state.counters["vertices/frame"] =
         static_cast<double>(frame.backend->vertices) / static_cast<double>(state.iterations());
 }
 BENCHMARK(BM_MenuFrame)->Arg(200)->Unit(benchmark::kMicrosecond);
+
+
+namespace {
+
+// A table of `rows` rows of five labelled cells, twenty rows shown at a time under a title,
+// with a scroll bar; the second column takes what the others leave.
+std::string TableDescription(int rows)
+{
+    std::string xml = "<?xml version=\"1.0\"?><gui><table_widget table_template=\"t\" table_height=\"20\" "
+                      "has_title=\"true\" enable_selection=\"true\" width=\"600\"><rows>";
+    for (int r = 0; r < rows; ++r) {
+        xml += "<row>";
+        for (int c = 0; c < 5; ++c)
+            xml += "<cell flex=\"" + std::string(c == 1 ? "1" : "0") + "\"><label_widget label_template=\"l\" text=\"" +
+                   std::string(c == 1 ? "name of a player" : "cell") + "\"/></cell>";
+        xml += "</row>";
+    }
+    return xml + "</rows></table_widget><GUITemplates><label_template id=\"l\" font=\"mono\"/>"
+                 "<scroll_template id=\"s\" vertical=\"true\" thumb_image=\"strip\" back_image=\"strip\" "
+                 "top_image=\"strip\" bottom_image=\"strip\"/><table_template id=\"t\" default_back_image=\"strip\" "
+                 "default_selection_back=\"strip\" lines_image=\"strip\" scroll_template=\"s\"/></GUITemplates></gui>";
+}
+
+} // namespace
+
+// One frame of a table of 1,000 rows of 5 cells: the bar moves on by a row's height (the
+// cells are placed again) and the table is drawn, title, rows in view and grid.
+static void BM_TableFrame(benchmark::State& state)
+{
+    Frame frame;
+    GuiAssets assets;
+    ox::core::CSettings settings;
+    auto table = LoadDescription<CTableWidget>(TableDescription(static_cast<int>(state.range(0))), settings);
+    CScrollWidget* scroll = table->GetScroll();
+    if (!assets.ready || !scroll || table->GetCellsCount() != 5 * state.range(0)) {
+        state.SkipWithError("the table was not built");
+        return;
+    }
+    float value = 0;
+    for (auto _ : state) {
+        value = value + 20 > scroll->GetMaxValue() - scroll->GetPageSize() ? 0 : value + 20;
+        scroll->SetValue(value);
+        frame.renderer.BeginScene();
+        table->Draw(frame.renderer);
+        frame.renderer.EndScene();
+    }
+    state.SetItemsProcessed(state.iterations());
+    state.counters["cells"] = static_cast<double>(table->GetCellsCount());
+    state.counters["vertices/frame"] =
+        static_cast<double>(frame.backend->vertices) / static_cast<double>(state.iterations());
+}
+BENCHMARK(BM_TableFrame)->Arg(1000)->Unit(benchmark::kMicrosecond);
+
+// A click on the expand box of a closed group of 1,000 children: it opens and the bars are
+// fitted to the rows now in view. (Closing it again is not measured.)
+static void BM_TreeExpand(benchmark::State& state)
+{
+    GuiAssets assets;
+    const std::string xml = "<?xml version=\"1.0\"?><gui><tree_widget tree_template=\"t\" width=\"300\" "
+                            "height=\"400\"/><GUITemplates><tree_template id=\"t\" font=\"mono\" offset=\"16\">"
+                            "<vertical_scroll scroll_template=\"s\"/><horizontal_scroll scroll_template=\"s\"/>"
+                            "</tree_template><scroll_template id=\"s\" thumb_image=\"strip\"/></GUITemplates></gui>";
+    ox::core::CSettings settings;
+    auto tree = LoadDescription<CTreeWidget>(xml, settings);
+    CTreeWidget::CNode* group = tree->AddNode(u"group", nullptr, CTreeWidget::CNode::FlagGroup);
+    for (int i = 0; i < state.range(0); ++i)
+        tree->AddNode(u"child node " + ox::wstring(1, static_cast<char16_t>(u'a' + i % 26)), group, 0);
+    const ox::misc::IntVector box(4, 4);
+    for (auto _ : state) {
+        tree->OnMouseDown(box, LeftButton, 0, false);
+        state.PauseTiming();
+        if (!group->ReadFlag(CTreeWidget::CNode::FlagExpanded))
+            state.SkipWithError("the group did not open");
+        tree->OnMouseDown(box, LeftButton, 0, false);
+        state.ResumeTiming();
+    }
+    state.SetItemsProcessed(state.iterations());
+}
+BENCHMARK(BM_TreeExpand)->Arg(1000)->Unit(benchmark::kMicrosecond);
 
 BENCHMARK_MAIN();

@@ -20,6 +20,8 @@
 #include "gui/controls/ToolTipHelperWidget.h"
 #include "gui/controls/ToolbarWidget.h"
 #include "gui/controls/TabWidget.h"
+#include "gui/controls/TableWidget.h"
+#include "gui/controls/TreeWidget.h"
 #include "gui/Window.h"
 #include "gui/WidgetManager.h"
 #include "lua/Lua.h"
@@ -372,7 +374,77 @@ void BindEditWidget(mluabind::Namespace& ns)
     AddCast<E>(ns, "CEditWidget.Cast");
 }
 
-// The composite controls: tabs.
+// The composite controls: tabs, tables and trees.
+constexpr NamedValue kTreeEvents[] = {
+    {"EventNodeAdded", CTreeWidget::EventNodeAdded},
+    {"EventNodeMoved", CTreeWidget::EventNodeMoved},
+    {"EventNodeRemoved", CTreeWidget::EventNodeRemoved},
+    {"EventCheckNodeParent", CTreeWidget::EventCheckNodeParent},
+    {"EventIconClicked", CTreeWidget::EventIconClicked},
+    {"EventTextDoubleClick", CTreeWidget::EventTextDoubleClick},
+    {"EventOnNodeSelection", CTreeWidget::EventOnNodeSelection},
+};
+
+constexpr NamedValue kNodeFlags[] = {
+    {"FlagSelected", CTreeWidget::CNode::FlagSelected},
+    {"FlagExpanded", CTreeWidget::CNode::FlagExpanded},
+    {"FlagGroup", CTreeWidget::CNode::FlagGroup},
+};
+
+mluabind::i::GenericClass& TreeNodeClass()
+{
+    using N = CTreeWidget::CNode;
+    auto& cls = Class<N>("CTreeWidget.CNode")
+                    .Method("GetIcon", &N::GetIcon)
+                    .Method("SetText", &N::SetText)
+                    .Method("GetText", &N::GetText)
+                    .Method("SetUserData", &N::SetUserData)
+                    .Method("GetUserData", &N::GetUserData)
+                    .Method("SetUserType", &N::SetUserType)
+                    .Method("GetUserType", &N::GetUserType)
+                    .Method("SetColor", &N::SetColor)
+                    .Method("GetColor", &N::GetColor)
+                    .Method("GetParent", &N::GetParent)
+                    .Method("GetFirstChild", &N::GetFirstChild)
+                    .Method("GetNextSibling", &N::GetNextSibling)
+                    .Method("GetPrevSibling", &N::GetPrevSibling)
+                    .Method("RaiseFlag", &N::RaiseFlag)
+                    .Method("ReadFlag", &N::ReadFlag)
+                    .Method("ClearFlag", &N::ClearFlag);
+    return WithConstants(cls, kNodeFlags);
+}
+
+mluabind::i::GenericClass& TreeWidgetClass()
+{
+    using T = CTreeWidget;
+    using N = T::CNode;
+    auto& cls =
+        Class<T>("CTreeWidget")
+            .BaseClass<CWidget>()
+            .Constructor<>()
+            .Method("AddNode", static_cast<N* (T::*)(const char*, const wstring&, N*, int32_t, int32_t)>(&T::AddNode))
+            .Method("AddNode", static_cast<N* (T::*)(const wstring&, N*, uint32_t)>(&T::AddNode))
+            .Method("MoveNode", &T::MoveNode)
+            .Method("RemoveNode", &T::RemoveNode)
+            .Method("UpdateNodes", &T::UpdateNodes)
+            .Method("Clear", &T::Clear)
+            .Method("ScrollToNode", &T::ScrollToNode)
+            .Method("FindNodeByPos", [](const T& t, const IntVector& pos) -> N* {
+                N* node = nullptr;
+                misc::FloatRect rect;
+                return t.FindNodeByPos(pos, node, rect) ? node : nullptr;
+            })
+            .Method("FindNodeByUserData", &T::FindNodeByUserData)
+            .Method("GetFirstNode", [](const T& t) { return t.GetFirstNode(); })
+            .Method("GetFirstNode", [](const T& t, int32_t type) { return t.GetFirstNode(type); })
+            .Method("GetSelectedNodes", &T::GetSelectedNodes)
+            .Method("ClearSelection", &T::ClearSelection)
+            .Method("SetScrollValue", &T::SetScrollValue)
+            .Method("GetScrollValue", &T::GetScrollValue)
+            .Method("SetEventHandler", static_cast<void (T::*)(lua::CLua*, const char*)>(&T::SetEventHandler));
+    return WithConstants(cls, kTreeEvents);
+}
+
 void BindComposites(mluabind::Namespace& ns)
 {
     using T = CTabWidget;
@@ -384,7 +456,24 @@ void BindComposites(mluabind::Namespace& ns)
                     .Method("GetSelectedPanel", &T::GetSelectedPanel)
                     .Method("GetPanelContent", static_cast<CWidget* (T::*)(int) const>(&T::GetPanelContent))
                     .Method("GetPanelContent", static_cast<CWidget* (T::*)(const wstring&) const>(&T::GetPanelContent)));
+    using B = CTableWidget;
+    ns.AddClass(Class<B>("CTableWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("GetCell", &B::GetCell)
+                    .Method("LoadRow", &B::LoadRow)
+                    .Method("FitCells", &B::FitCells)
+                    .Method("GetCellsCount", &B::GetCellsCount)
+                    .Method("ClearTable", &B::ClearTable)
+                    .Method("SelectRow", &B::SelectRow)
+                    .Method("GetSelectedRow", &B::GetSelectedRow));
+    ns.AddClass(TreeNodeClass());
+    ns.AddClass(TreeWidgetClass());
+    ns.AddClass(mluabind::IntrusivePtrClass<CTreeWidget::CNode>("CTreeWidget.CNodePtrT"));
+    ns.Merge(mluabind::VectorClass<CTreeWidget::NodePtrT>("CTreeWidget.SelectedNodesT"));
     AddCast<T>(ns, "CTabWidget.Cast");
+    AddCast<B>(ns, "CTableWidget.Cast");
+    AddCast<CTreeWidget>(ns, "CTreeWidget.Cast");
 }
 
 void BindControls(mluabind::Namespace& ns)

@@ -16,6 +16,8 @@
 #include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolbarWidget.h"
 #include "gui/controls/TabWidget.h"
+#include "gui/controls/TableWidget.h"
+#include "gui/controls/TreeWidget.h"
 
 namespace ox::gui {
 
@@ -79,6 +81,8 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CSliderWidget>("slider_widget");
     factory.RegisterWidget<CEditWidget>("edit_widget");
     factory.RegisterWidget<CTabWidget>("tab_widget");
+    factory.RegisterWidget<CTableWidget>("table_widget");
+    factory.RegisterWidget<CTreeWidget>("tree_widget");
 }
 
 } // namespace ox::gui

@@ -1,6 +1,6 @@
-// The demo's scripts/profiles.lua against the real game vocabulary, its windows and level
-// replaced by recorders: the chooser makes and switches players, F ends the level and the
-// records window shows the new entry, and each switch and close saves the level.
+// The demo's scripts/profiles.lua and records.lua against the real game vocabulary, their
+// windows and level replaced by recorders: the chooser makes and switches players, F ends the
+// level and the records window shows the new entry, and each switch and close saves the level.
 #include "game/GameBinding.h"
 #include "game/GameOptions.h"
 #include "game/Profile.h"
@@ -28,7 +28,7 @@ const char* const kStage = R"(
     texts = {}
     local function window(id)
         return { id = id,
-                 GetWidget = function(name) return name end,
+                 GetWidget = function(name) if name ~= 'records_table' then return name end end,
                  GetParentWindow = function() return { RemoveChildWindow = function() note('closed ' .. id) end } end }
     end
     demo = {
@@ -62,7 +62,8 @@ TEST(DemoProfilesScript, ChooserPlayersRecordsAndSaves)
     lua.EndBinding();
     lua_State* L = lua.GetLuaState();
     ASSERT_EQ(oxtest::RunChunk(L, kStage), "nil");
-    ASSERT_EQ(oxtest::RunChunk(L, oxtest::ReadFile(std::filesystem::path(OX_DEMO_GAME) / "scripts" / "profiles.lua")), "nil");
+    for (const char* script : {"profiles.lua", "records.lua"})
+        ASSERT_EQ(oxtest::RunChunk(L, oxtest::ReadFile(std::filesystem::path(OX_DEMO_GAME) / "scripts" / script)), "nil");
 
     EXPECT_EQ(oxtest::RunChunk(L, R"(
         Run()
@@ -74,13 +75,13 @@ TEST(DemoProfilesScript, ChooserPlayersRecordsAndSaves)
         press('slot1')
         local c = texts.current
         DemoWindow.OnKeyDown(nil, 70, 0, 0, false)
-        local d = (texts.row1:gsub('%d+$', 'N'))
+        local d = texts.place1 .. ' ' .. texts.name1 .. ' ' .. (texts.score1:gsub('%d+$', 'N'))
         DemoWindow.OnKeyDown(nil, 32, 0, 0, false)
         quest.OnClose()
         return table.concat({a, b, c, d}, '/') .. '\n' .. table.concat(log, ', ')
     )"),
               "Nobody plays yet: add a new player/Playing: Player 2|Player 1|Player 2|/Playing: Player 1/"
-              "> 1.  Player 1                   N\n"
+              "1. Player 1 N\n"
               "base run, open profiles, level built, save, level built, save, level built, restore, save, "
               "open records, base key, save, base close");
     EXPECT_TRUE(boxes.Boxes().empty()) << boxes.Boxes().front().text;

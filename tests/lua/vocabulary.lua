@@ -206,6 +206,22 @@ V.controls = {
         ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
                                    "SetMaxChars", "OnTextChanged" },
         ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
+        ["ox.gui.CTableWidget"] = { "GetCell", "LoadRow", "FitCells", "GetCellsCount", "ClearTable", "SelectRow",
+                                    "GetSelectedRow" },
+        ["ox.gui.CTreeWidget"] = {
+            AddNode = 2, "MoveNode", "RemoveNode", "UpdateNodes", "Clear", "ScrollToNode", "FindNodeByPos",
+            "FindNodeByUserData", GetFirstNode = 2, "GetSelectedNodes", "ClearSelection", "SetScrollValue",
+            "GetScrollValue", "SetEventHandler",
+            constants = { EventNodeAdded = 0, EventNodeMoved = 1, EventNodeRemoved = 2, EventCheckNodeParent = 3,
+                          EventIconClicked = 4, EventTextDoubleClick = 5, EventOnNodeSelection = 6 },
+        },
+        ["ox.gui.CTreeWidget.CNode"] = {
+            "GetIcon", "SetText", "GetText", "SetUserData", "GetUserData", "SetUserType", "GetUserType", "SetColor",
+            "GetColor", "GetParent", "GetFirstChild", "GetNextSibling", "GetPrevSibling", "RaiseFlag", "ReadFlag",
+            "ClearFlag",
+            constants = { FlagSelected = 1, FlagExpanded = 2, FlagGroup = 4 },
+        },
+        ["ox.gui.CTreeWidget.SelectedNodesT"] = { "size", at = 2 },
     },
 }
 
@@ -224,9 +240,6 @@ V.pending = {
     },
     widgets = {
         classes = {
-            ["ox.gui.CTableWidget"] = { "GetCell", "LoadRow", "FitCells", "GetCellsCount", "ClearTable", "SelectRow",
-                                        "GetSelectedRow" },
-            ["ox.gui.CTreeWidget"] = {},
         },
     },
 }

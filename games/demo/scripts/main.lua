@@ -137,3 +137,7 @@ ox.lua.CLua.GetLua("main").LoadScript("scripts/minigame.lua")
 ox.lua.CLua.GetLua("main").LoadScript("scripts/achievements.lua")
 -- The order of the levels: Play continues with the player's next level.
 ox.lua.CLua.GetLua("main").LoadScript("scripts/levels.lua")
+-- The table of records.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/records.lua")
+-- The developer window, F12 in the first window at debug level 2.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/devtools.lua")

@@ -175,7 +175,7 @@ function MainMenu.OnChildAction(self, action, sender)
     elseif id == "profiles" and Profiles then
         Profiles.OpenChooser()
     elseif id == "records" and Profiles then
-        Profiles.OpenRecords()
+        Records.Open()
     elseif id == "options" or id == "profiles" or id == "records" or id == "achievements" then
         Menu.Open(self, id)
     elseif id == "quit" then

@@ -1,13 +1,12 @@
--- Lantern Demo: players, their options and the table of records. main.lua loads this file
--- last. At the start the player of the last session goes on where they left the level. In
--- the first window P opens the players' chooser (gui.xml, window "profiles", where a new
--- player's name is typed), R the records and F ends the level now (a shortcut until the level
--- can be played to its end). The level's state goes into the player's save file when the game
--- closes, when another player takes over and when the level ends.
+-- Lantern Demo: players and their options (the table of records is scripts/records.lua).
+-- main.lua loads this file last. At the start the player of the last session goes on where
+-- they left the level. In the first window P opens the players' chooser (gui.xml, window
+-- "profiles", where a new player's name is typed), R the records and F ends the level now (a
+-- shortcut until the level can be played to its end). The level's state goes into the player's
+-- save file when the game closes, when another player takes over and when the level ends.
 
 Profiles = Profiles or {}
 ProfilesWnd = ProfilesWnd or {}
-RecordsWnd = RecordsWnd or {}
 
 local function S(value)
     if type(value) == "userdata" then
@@ -125,7 +124,7 @@ function Profiles.LevelFinished()
     records().Save()
     Profiles.SaveLevel()
     print("Lantern Demo: " .. (lantern.level_id or "level1") .. " finished by " .. S(player.GetName()) .. " with " .. score .. " points, place " .. place)
-    Profiles.OpenRecords()
+    Records.Open()
 end
 
 -- Windows. A window opens over the top one and closes through the window under it.
@@ -149,14 +148,6 @@ function Profiles.OpenChooser()
     end
 end
 
-function Profiles.OpenRecords()
-    local wnd = demo.OpenWindow("records")
-    if wnd then
-        print("Lantern Demo: the records open")
-        Profiles.FillRecords(wnd)
-    end
-end
-
 function Profiles.FillChooser(wnd)
     local current = Profiles.Current()
     set(wnd, "current", current and ("Playing: " .. S(current.GetName())) or "Nobody plays yet: add a new player")
@@ -168,18 +159,6 @@ function Profiles.FillChooser(wnd)
         local name = player and S(player.GetName()) or ""
         Profiles.slots[slot] = name
         set(wnd, "slot" .. slot .. "_name", name)
-    end
-end
-
-function Profiles.FillRecords(wnd)
-    local it, place = records().GetRecords(), 1
-    local last = records().GetLastRecordPos()
-    while not it.IsEnd() do
-        local record = it.Get()
-        set(wnd, "row" .. place, string.format("%s%2d.  %-24s %6d", place == last and ">" or " ", place, S(record.Name),
-                                               record.Score))
-        place = place + 1
-        it.Next()
     end
 end
 
@@ -208,7 +187,7 @@ function ProfilesWnd.OnChildAction(wnd, action, sender)
             box.SetText("")
         end
     elseif id == "show_records" then
-        Profiles.OpenRecords()
+        Records.Open()
         return true
     elseif id == "play" then
         if not Profiles.Current() then
@@ -222,15 +201,8 @@ function ProfilesWnd.OnChildAction(wnd, action, sender)
     return true
 end
 
-function RecordsWnd.OnChildAction(wnd, action, sender)
-    if S(sender.GetId()) == "close_records" then
-        close(wnd)
-    end
-    return true
-end
-
 -- Hooks into main.lua's functions, made again whenever main.lua runs again.
-local keys = { [80] = Profiles.OpenChooser, [82] = Profiles.OpenRecords, [70] = Profiles.LevelFinished }
+local keys = { [80] = Profiles.OpenChooser, [82] = function() Records.Open() end, [70] = Profiles.LevelFinished }
 
 if Run ~= Profiles.run then
     local base_run = Run
