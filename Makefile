@@ -7,8 +7,9 @@ FUZZ_SECONDS ?= 60
 FUZZ_RSS_MB ?= 1024
 FUZZ_TARGETS ?=
 ASAN_DIR ?= build-asan
+GAMES_DIR ?= games
 
-.PHONY: all deps configure build test test-asan run bench fuzz clean
+.PHONY: all deps configure build test test-asan run bench fuzz clean package new-game play
 
 all: build
 
@@ -68,6 +69,28 @@ fuzz: deps
 		fi; \
 	done; \
 	if [ -n "$$failed" ]; then echo "fuzz: findings in$$failed (see $(FUZZ_DIR)/findings)"; exit 1; fi
+
+# An installable Debian package of the engine, the tools and the demo: $(BUILD_DIR)/k17_*.deb.
+package: configure
+	@cmake --build $(BUILD_DIR) --target k17 oxpack oxdump oxmedia oxfont oxlint
+	@cd $(BUILD_DIR) && cpack -G DEB
+
+# A new game folder $(GAMES_DIR)/NAME made from games/template, its product named NAME.
+new-game:
+	@case "$(NAME)" in ""|*[!A-Za-z0-9_-]*) echo "make new-game NAME=...: a name of letters, digits, _ and -"; exit 2;; esac
+	@if [ -e "$(GAMES_DIR)/$(NAME)" ]; then echo "make new-game: $(GAMES_DIR)/$(NAME) exists already"; exit 1; fi
+	@mkdir -p "$(GAMES_DIR)"
+	@cp -r games/template "$(GAMES_DIR)/$(NAME)"
+	@sed -i 's/product="My Game"/product="$(NAME)"/' "$(GAMES_DIR)/$(NAME)/game.xml"
+	@sed -i 's|>My Game<|>$(NAME)<|' "$(GAMES_DIR)/$(NAME)/properties/strings.xml"
+	@echo "$(GAMES_DIR)/$(NAME): made from games/template; check it with $(BUILD_DIR)/tools/oxlint $(GAMES_DIR)/$(NAME)"
+
+# Starts the game folder games/GAME (make play GAME=NAME) in $(BUILD_DIR)/play-GAME, which links its files.
+play: build
+	@[ -f "$(GAMES_DIR)/$(GAME)/game.xml" ] || { echo "make play GAME=NAME: no $(GAMES_DIR)/$(GAME)/game.xml"; exit 2; }
+	@mkdir -p $(BUILD_DIR)/play-$(GAME) && for entry in $(abspath $(GAMES_DIR)/$(GAME))/*; do \
+		ln -sfn "$$entry" $(BUILD_DIR)/play-$(GAME)/$$(basename "$$entry"); done
+	@cd $(BUILD_DIR)/play-$(GAME) && exec $(abspath $(BUILD_DIR))/src/k17
 
 clean:
 	rm -rf $(BUILD_DIR) $(FUZZ_DIR) $(ASAN_DIR)
