@@ -136,6 +136,9 @@ cursor_lua_widget = {
 
 -- The level's rules ----------------------------------------------------------------------------
 
+-- The clips played over the scenes, at the size of their own view (properties/clips.xml).
+L.clip_sizes = { found_sparkle = 120, hint_glow = 160 }
+
 -- A clip played over a scene at `pos` for `ms` milliseconds of the level's clock: it takes no
 -- click, and goes when its time is over.
 function sparkle(scene_id, pos, clip_id, ms)
@@ -145,6 +148,8 @@ function sparkle(scene_id, pos, clip_id, ms)
     end
     local clip = qe.CClipObject()
     clip.SetClipId(clip_id)
+    local size = L.clip_sizes[clip_id]
+    clip.SetSize(ox.misc.FloatVector(size, size))
     clip.SetPos(pos)
     clip.RaiseObjectFlag(qe.CBaseSceneObject.ObjectFlagDisable)
     local held = qe.CBaseSceneObjectPtrT(clip)
