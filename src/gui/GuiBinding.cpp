@@ -7,13 +7,19 @@
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
 #include "gui/controls/ClipWidget.h"
+#include "gui/controls/EditWidget.h"
 #include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ComboBoxWidget.h"
+#include "gui/controls/ListWidget.h"
+#include "gui/controls/ScrollWidget.h"
+#include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolTipHelperWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 #include "gui/Window.h"
 #include "gui/WidgetManager.h"
 #include "lua/Lua.h"
@@ -350,6 +356,37 @@ void AddCast(mluabind::Namespace& ns, const char* name)
     ns.AddFunction(mluabind::Function(name, [](CBaseWidget* widget) { return dynamic_cast<W*>(widget); }));
 }
 
+void BindEditWidget(mluabind::Namespace& ns)
+{
+    using E = CEditWidget;
+    ns.AddClass(Class<E>("CEditWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("SetEditColors", &E::SetEditColors)
+                    .Method("SelectText", &E::SelectText)
+                    .Method("SetText", &E::SetText)
+                    .Method("GetText", &E::GetText)
+                    .Method("SetTextJustification", &E::SetTextJustification)
+                    .Method("SetMaxChars", &E::SetMaxChars)
+                    .Method("OnTextChanged", &E::OnTextChanged));
+    AddCast<E>(ns, "CEditWidget.Cast");
+}
+
+// The composite controls: tabs.
+void BindComposites(mluabind::Namespace& ns)
+{
+    using T = CTabWidget;
+    ns.AddClass(Class<T>("CTabWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("EnumPanels", &T::EnumPanels)
+                    .Method("SelectPanel", &T::SelectPanel)
+                    .Method("GetSelectedPanel", &T::GetSelectedPanel)
+                    .Method("GetPanelContent", static_cast<CWidget* (T::*)(int) const>(&T::GetPanelContent))
+                    .Method("GetPanelContent", static_cast<CWidget* (T::*)(const wstring&) const>(&T::GetPanelContent)));
+    AddCast<T>(ns, "CTabWidget.Cast");
+}
+
 void BindControls(mluabind::Namespace& ns)
 {
     ns.AddClass(ImageWidgetClass());
@@ -393,6 +430,91 @@ void BindControls(mluabind::Namespace& ns)
     AddCast<CToolbarWidget>(ns, "CToolbarWidget.Cast");
     AddCast<CImageBoxWidget>(ns, "CImageBoxWidget.Cast");
     AddCast<CWindow>(ns, "CWindow.Cast");
+    BindEditWidget(ns);
+}
+
+constexpr NamedValue kListColors[] = {
+    {"ListColorTextNormal", CListWidget::ListColorTextNormal},
+    {"ListColorTextSelected", CListWidget::ListColorTextSelected},
+    {"ListColorTextOver", CListWidget::ListColorTextOver},
+    {"ListColorSelection", CListWidget::ListColorSelection},
+};
+
+// The line operations a list and a combo box share; texts come as wide strings or plain
+// Lua strings.
+template <class W, class C>
+C& LineMethods(C& cls)
+{
+    return cls.Method("ClearLines", &W::ClearLines)
+        .Method("EnumLines", &W::EnumLines)
+        .Method("AddLine", [](W& w, const char16_t* text) { w.AddLine(text ? text : u""); })
+        .Method("GetLine", &W::GetLine)
+        .Method("FindLine", [](const W& w, const char16_t* text) { return w.FindLine(text ? text : u""); })
+        .Method("SetLine", [](W& w, int index, const char16_t* text) { w.SetLine(index, text ? text : u""); })
+        .Method("RemoveLine", &W::RemoveLine)
+        .Method("SelectLine", &W::SelectLine)
+        .Method("GetSelectedLine", &W::GetSelectedLine);
+}
+
+mluabind::i::GenericClass& ListWidgetClass()
+{
+    using W = CListWidget;
+    auto& cls = Class<W>("CListWidget").BaseClass<CWidget>().Constructor<>();
+    LineMethods<W>(cls)
+        .Method("CalcHeightToFitLines", &W::CalcHeightToFitLines)
+        .Method("SetListHeight", &W::SetListHeight)
+        .Method("GetScrollWidth", &W::GetScrollWidth)
+        .Method("SetScrollValue", &W::SetScrollValue)
+        .Method("GetScrollValue", &W::GetScrollValue)
+        .Method("SetLineJustifications", &W::SetLineJustifications)
+        .Method("SetListColors", &W::SetListColors)
+        .Method("OnLineSelected", &W::OnLineSelected);
+    return WithConstants(cls, kListColors);
+}
+
+mluabind::i::GenericClass& ComboBoxWidgetClass()
+{
+    using W = CComboBoxWidget;
+    auto& cls = Class<W>("CComboBoxWidget").BaseClass<CWidget>().Constructor<>();
+    return LineMethods<W>(cls)
+        .Method("ShowList", &W::ShowList)
+        .Method("IsListShown", &W::IsListShown)
+        .Method("GetText", &W::GetText)
+        .Method("OnLineSelected", &W::OnLineSelected);
+}
+
+// The value controls: scroll bar, slider, list and combo box.
+void BindValueControls(mluabind::Namespace& ns)
+{
+    using S = CScrollWidget;
+    ns.AddClass(Class<S>("CScrollWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Constructor<bool>()
+                    .Method("SetValue", &S::SetValue)
+                    .Method("GetValue", &S::GetValue)
+                    .Method("SetMaxValue", &S::SetMaxValue)
+                    .Method("GetMaxValue", &S::GetMaxValue)
+                    .Method("SetPageSize", &S::SetPageSize)
+                    .Method("GetPageSize", &S::GetPageSize)
+                    .Method("SetButtonValue", &S::SetButtonValue)
+                    .Method("SetImages", &S::SetImages)
+                    .Method("OnValueChanged", &S::OnValueChanged));
+    AddCast<S>(ns, "CScrollWidget.Cast");
+    using L = CSliderWidget;
+    ns.AddClass(Class<L>("CSliderWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("SetValue", &L::SetValue)
+                    .Method("GetValue", &L::GetValue)
+                    .Method("SetImages", &L::SetImages)
+                    .Method("OnValueChanged", &L::OnValueChanged));
+    AddCast<L>(ns, "CSliderWidget.Cast");
+    ns.AddClass(Class<CThumbWidget>("CThumbWidget").BaseClass<CImageWidget>().Constructor<>());
+    ns.AddClass(ListWidgetClass());
+    AddCast<CListWidget>(ns, "CListWidget.Cast");
+    ns.AddClass(ComboBoxWidgetClass());
+    AddCast<CComboBoxWidget>(ns, "CComboBoxWidget.Cast");
 }
 
 } // namespace
@@ -414,7 +536,9 @@ mluabind::Namespace BindGui()
     ns.AddFunction(mluabind::Function("g_Cursor.Instance", &CCursor::Instance));
     ns.AddClass(Class<CWidgetManager>("CWidgetManager").Method("GetKeyboardState", &CWidgetManager::GetKeyboardState));
     BindEffects(ns);
+    BindComposites(ns);
     BindControls(ns);
+    BindValueControls(ns);
     return ns;
 }
 

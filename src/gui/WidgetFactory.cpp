@@ -4,12 +4,18 @@
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
 #include "gui/controls/ClipWidget.h"
+#include "gui/controls/EditWidget.h"
 #include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 #include "gui/controls/LabelWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/ComboBoxWidget.h"
+#include "gui/controls/ListWidget.h"
+#include "gui/controls/ScrollWidget.h"
+#include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 
 namespace ox::gui {
 
@@ -67,6 +73,12 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CLuaWidget>("lua_widget");
     factory.RegisterWidget<CClipWidget>("clip_widget");
     factory.RegisterWidget<CToolbarWidget>("toolbar_widget");
+    factory.RegisterWidget<CScrollWidget>("scroll_widget");
+    factory.RegisterWidget<CListWidget>("list_widget");
+    factory.RegisterWidget<CComboBoxWidget>("combobox_widget");
+    factory.RegisterWidget<CSliderWidget>("slider_widget");
+    factory.RegisterWidget<CEditWidget>("edit_widget");
+    factory.RegisterWidget<CTabWidget>("tab_widget");
 }
 
 } // namespace ox::gui
