@@ -136,6 +136,9 @@ cursor_lua_widget = {
 
 -- The level's rules ----------------------------------------------------------------------------
 
+-- The clips played over the scenes, at the size of their own view (properties/clips.xml).
+L.clip_sizes = { found_sparkle = 120, hint_glow = 160 }
+
 -- A clip played over a scene at `pos` for `ms` milliseconds of the level's clock: it takes no
 -- click, and goes when its time is over.
 function sparkle(scene_id, pos, clip_id, ms)
@@ -145,6 +148,8 @@ function sparkle(scene_id, pos, clip_id, ms)
     end
     local clip = qe.CClipObject()
     clip.SetClipId(clip_id)
+    local size = L.clip_sizes[clip_id]
+    clip.SetSize(ox.misc.FloatVector(size, size))
     clip.SetPos(pos)
     clip.RaiseObjectFlag(qe.CBaseSceneObject.ObjectFlagDisable)
     local held = qe.CBaseSceneObjectPtrT(clip)
@@ -382,19 +387,20 @@ local function show_charge()
     end
 end
 
--- A thread for the level's life: a used hint charges again over L.recharge_time.
+-- A thread for the level's life: a used hint charges again over L.recharge_time milliseconds
+-- of the level's clock.
 function recharge_hints()
-    local step = 250
     while true do
         if L.charge < 1 then
-            L.charge = math.min(1, L.charge + step / L.recharge_time)
+            local since = qe.g_LuaThreadManager.Instance().GetElapsedTime() - L.used_at
+            L.charge = math.min(1, since / L.recharge_time)
             if L.charge >= 1 then
                 sound("hint_ready")
                 print("Lantern Demo: the hint is charged again")
             end
         end
         show_charge()
-        wait(step)
+        wait(250)
     end
 end
 
@@ -410,7 +416,7 @@ function use_hint()
         print("Lantern Demo: nothing left to find here")
         return
     end
-    L.charge = 0
+    L.charge, L.used_at = 0, qe.g_LuaThreadManager.Instance().GetElapsedTime()
     show_charge()
     sparkle(scene, L.level.FindObjectById(id, false, false).GetPos(), "hint_glow", 2500)
     sound("hint")
