@@ -1,7 +1,8 @@
 #!/bin/sh
 # Prepares the folder `make run` starts the demo in: every file of this folder linked in (so
 # edits of scripts and descriptions reach the running game), and the start-up pictures the
-# game shows before its load window: two splash screens in fsdata/ and a logo in branch/.
+# game shows before its load window: two splash screens in fsdata/ and a logo in branch/,
+# and the videos (make-videos.sh) in video/.
 # They stay out of games/demo, whose copies the headless tests start straight into the load
 # window.
 #
@@ -21,4 +22,5 @@ done
 "$tools/oxmedia" jpeg "$out/fsdata/splash2.jpg" --size 1024x768 --pattern gradient --quality 80 >/dev/null
 "$tools/oxmedia" jpeg "$out/fsdata/splash1.jpg" --size 800x600 --pattern circle --quality 80 >/dev/null
 "$tools/oxmedia" jpeg "$out/branch/logo1.jpg" --size 512x256 --pattern stripes --quality 80 >/dev/null
+"$here/make-videos.sh" "$tools" "$out"
 echo "$out"

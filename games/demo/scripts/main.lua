@@ -134,3 +134,5 @@ ox.lua.CLua.GetLua("main").LoadScript("scripts/engine_tour.lua")
 ox.lua.CLua.GetLua("main").LoadScript("scripts/minigame.lua")
 -- Achievements: awarded in the level, shown from the main menu.
 ox.lua.CLua.GetLua("main").LoadScript("scripts/achievements.lua")
+-- The intro video before the menu, and the lamp's glow in the level's window.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/intro.lua")

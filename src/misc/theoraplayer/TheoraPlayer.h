@@ -233,12 +233,13 @@ private:
     bool m_HasTheora = false, m_HasVorbis = false, m_VorbisReady = false;
 
     unsigned m_Width = 0, m_Height = 0, m_Stride = 0;
-    float m_Duration = 0, m_FPS = 0;
+    std::atomic<float> m_Duration{0};  // rises as the worker meets later frames
+    float m_FPS = 0;
     int m_NumFrames = 0;
     std::atomic<int> m_NumDroppedFrames{0};
     std::atomic<int> m_Iteration{0};
     std::atomic<bool> m_EndOfFile{false};
-    bool m_AutoRestart = false;
+    std::atomic<bool> m_AutoRestart{false};
     int64_t m_FrameNumber = -1;
 };
 
