@@ -1,8 +1,9 @@
 #!/bin/sh
 # Prepares the folder `make run` starts the demo in: the game's data packed into game.pack by
-# oxpack, as a game ships, and the start-up pictures the game shows before its load window:
-# two splash screens in fsdata/ and a logo in branch/. They stay out of games/demo, whose copies
-# the headless tests start straight into the load window.
+# oxpack, as a game ships, the start-up pictures the game shows before its load window (two
+# splash screens in fsdata/ and a logo in branch/) and the videos (make-videos.sh) in video/.
+# They stay out of games/demo, whose copies the headless tests start straight into the load
+# window.
 #
 #   games/demo/stage-run.sh [TOOLS_DIR [OUT_DIR]]
 #
@@ -44,4 +45,5 @@ fi
 "$tools/oxmedia" jpeg "$out/fsdata/splash2.jpg" --size 1024x768 --pattern gradient --quality 80 >/dev/null
 "$tools/oxmedia" jpeg "$out/fsdata/splash1.jpg" --size 800x600 --pattern circle --quality 80 >/dev/null
 "$tools/oxmedia" jpeg "$out/branch/logo1.jpg" --size 512x256 --pattern stripes --quality 80 >/dev/null
+"$here/make-videos.sh" "$tools" "$out"
 echo "$out"

@@ -6,6 +6,8 @@
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "graphics/Image.h"
+#include "graphics/Video.h"
+#include "graphics/VideoPlayer.h"
 #include "gui/Cursor.h"
 #include "gui/GuiServices.h"
 #include "gui/WidgetFactory.h"
@@ -26,6 +28,25 @@ namespace ox::core {
 CApplication* g_Application = nullptr;
 
 namespace {
+
+// Videos make their surfaces through the texture manager, take the game's frame delta, play
+// their sounds through the audio manager and pause with the game.
+void ConnectVideo(MediaPauseHooks& hooks)
+{
+    graphics::VideoServices& video = graphics::GetVideoServices();
+    video.createSurface = [](unsigned w, unsigned h) { return CTextureManager::Instance().CreateSurface(w, h); };
+    video.removeUnusedSurfaces = [] { CTextureManager::Instance().RemoveUnusedSurfaces(); };
+    video.frameDelta = [] { return CTimeManager::Instance().GetFrameDelta(); };
+    auto& audio = sound::CAudioManager::Instance();
+    video.playSound = [&audio](const char* id, int repeat) {
+        return audio.Play(id, sound::CAudioManager::kKeep, sound::CAudioManager::kKeep, -2, repeat);
+    };
+    video.stopSound = [&audio](uint32_t handle, float fade) { audio.Stop(handle, fade); };
+    video.pauseSound = [&audio](uint32_t handle, bool pause) { audio.Pause(handle, pause); };
+    video.seekSound = [&audio](uint32_t handle, float seconds) { audio.SetPosition(handle, seconds); };
+    video.repeatSound = [&audio](uint32_t handle, int repeat) { audio.SetRepeatCount(handle, repeat); };
+    hooks.video = [](bool pause) { pause ? graphics::PauseCurrentVideo() : graphics::ResumeCurrentVideo(); };
+}
 
 wstring UserDataBase()
 {
@@ -177,6 +198,7 @@ bool CApplication::Init()
     GetAudioManager().SetOnDemand(allOnDemand);
     m_Renderer.AddDeviceResourceOwner(&CTextureManager::Instance());
     graphics::CImage::SetTextureLookup([](const char* id) { return CTextureManager::Instance().GetItem(id); });
+    ConnectVideo(m_MediaHooks);
     // The display modes can be listed once the platform layer is up.
     m_Renderer.EnumResolutions();
     gui::RegisterFrameworkWidgets(gui::GetWidgetFactory());

@@ -5,6 +5,7 @@
 #include "diag/Assert.h"
 #include "diag/DiagBinding.h"
 #include "graphics/GraphicsBinding.h"
+#include "graphics/VideoBinding.h"
 #include "gui/GuiBinding.h"
 #include "lua/Lua.h"
 #include "lua/LuaBinding.h"
@@ -45,8 +46,8 @@ using Binder = void (*)(mluabind::CHost&);
 
 // In this order.
 constexpr Binder kBinders[] = {
-    &BindCore, &graphics::BindGraphics, &BindMiscStep, &BindLuaStep, &gui::BindGuiVocabulary, &sound::BindSound,
-    &replay::BindReplay, &diag::BindDiag,
+    &BindCore, &graphics::BindGraphics, &graphics::BindVideo, &BindMiscStep, &BindLuaStep, &gui::BindGuiVocabulary,
+    &sound::BindSound, &replay::BindReplay, &diag::BindDiag,
 };
 
 } // namespace

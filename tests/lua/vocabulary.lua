@@ -154,6 +154,14 @@ V.required = {
             "SetTimer", "SetEmiterSize", "SetLocation",
             constants = { IsStopEmit = 32768, IsContinuous = 2048 },
         },
+        ["ox.graphics.CVideoPlayer"] = { LoadFromFile = 2, "LoadFromFileAlpha", "IsTransparent", "GetWidth",
+                                         "GetHeight", Draw = 2, "Update", "GetDuration", "GetTime" },
+        ["ox.graphics.COpaqueVideo"] = { "Release", "LoadFromFile", "AttachSound", "GetTexture", "GetWidth",
+                                         "GetHeight", Draw = 2, "Update", "GetDuration", "GetTime", "Pause",
+                                         "Resume", "MoveToTime", "CycleAfterEnd" },
+        ["ox.graphics.CTranslucentVideo"] = { "Release", "LoadFromFile", "AttachSound", "GetTexture", "GetWidth",
+                                              "GetHeight", Draw = 2, "Update", "GetDuration", "GetTime", "Pause",
+                                              "Resume", "MoveToTime", "CycleAfterEnd" },
 
         ["ox.gui.IntInsets"] = {}, ["ox.gui.FloatInsets"] = {},
         ["ox.gui.CCursor"] = {}, ["ox.gui.CWidgetManager"] = { "GetKeyboardState" },
@@ -226,18 +234,6 @@ V.controls = {
 }
 
 V.pending = {
-    video = {
-        classes = {
-            ["ox.graphics.CVideoPlayer"] = { LoadFromFile = 2, "LoadFromFileAlpha", "IsTransparent", "GetWidth",
-                                             "GetHeight", Draw = 2, "Update", "GetDuration", "GetTime" },
-            ["ox.graphics.COpaqueVideo"] = { "Release", "LoadFromFile", "AttachSound", "GetTexture", "GetWidth",
-                                             "GetHeight", Draw = 2, "Update", "GetDuration", "GetTime", "Pause",
-                                             "Resume", "MoveToTime", "CycleAfterEnd" },
-            ["ox.graphics.CTranslucentVideo"] = { "Release", "LoadFromFile", "AttachSound", "GetTexture", "GetWidth",
-                                                  "GetHeight", Draw = 2, "Update", "GetDuration", "GetTime", "Pause",
-                                                  "Resume", "MoveToTime", "CycleAfterEnd" },
-        },
-    },
     widgets = {
         classes = {
         },

@@ -1,10 +1,12 @@
-// oxmedia: image and sound content for the game. Generates test images and Ogg Vorbis
-// tones, converts images to the PVR containers, builds the alpha-mask table, and describes
+// oxmedia: image, sound and video content for the game. Generates test images, Ogg Vorbis
+// tones and Ogg Theora videos, converts images to the PVR containers, builds the alpha-mask table, and describes
 // media files, all with the code the game reads them with.
 #include "core/TexturesAlpha.h"
 #include "core/TexturesAlphaWriter.h"
 #include "common/LogToStderr.h"
 #include "diag/Log.h"
+#include "graphics/VideoTrack.h"
+#include "misc/theoraplayer/TheoraWriter.h"
 #include "misc/sys/Path.h"
 #include "misc/imagelib/ImageLib.h"
 #include "misc/imagelib/MediaWriter.h"
@@ -34,7 +36,8 @@ const char* kUsage =
     "       oxmedia alpha <out.bindump> [--order O] [ID=]IMAGE...\n"
     "                                                       build the alpha-mask table\n"
     "       oxmedia ogg <out.ogg> [options]                 write tones as Ogg Vorbis\n"
-    "       oxmedia info FILE...                            describe images, containers, tables, sounds\n"
+    "       oxmedia ogv <out.ogv> [options]                 write generated frames as Ogg Theora\n"
+    "       oxmedia info FILE...                            describe images, containers, tables, sounds, videos\n"
     "       oxmedia COMMAND --help                          details of one command\n";
 
 const char* kPngHelp =
@@ -79,12 +82,23 @@ const char* kOggHelp =
     "--amplitude (of full scale) to 0.5; --quality (-0.1 to 1) to 0.4. --no-end leaves the\n"
     "last page without its end-of-stream flag, as a cut file has it.\n";
 
+const char* kOgvHelp =
+    "usage: oxmedia ogv <out.ogv> [--size WxH] [--frames N] [--fps F] [--pattern NAME] [--layout L]\n"
+    "                   [--quality Q] [--tone HZ[:SECONDS][,...]] [--rate R] [--channels 1|2]\n"
+    "\n"
+    "Writes an Ogg Theora video of generated frames, the same bytes every time. --size\n"
+    "defaults to 64x48, --frames to 25, --fps to 25, --pattern to levels (also bars, disc),\n"
+    "--quality (0 to 63) to 48. Layouts: colour (default); alpha, the frames' alpha as grey\n"
+    "(the alpha track of a translucent video); stacked, colour above and alpha below in a\n"
+    "picture twice as high. --tone adds a Vorbis track of sine tones as for ogg (rate\n"
+    "default 22050, one channel).\n";
+
 const char* kInfoHelp =
     "usage: oxmedia info FILE...\n"
     "\n"
     "Prints the size of PNG and JPEG images, the size and surface format of .pvr and\n"
     ".pvrlzo containers, the masks of an alpha-mask table, and the rate, channels and\n"
-    "length of an Ogg Vorbis file.\n";
+    "length of an Ogg Vorbis file, and the picture size and duration of an Ogg Theora video.\n";
 
 int UsageError(const std::string& message, const char* usage = kUsage)
 {
@@ -394,6 +408,78 @@ int Ogg(int argc, char** argv)
     return 0;
 }
 
+int Ogv(int argc, char** argv)
+{
+    Generated g;
+    g.width = 64, g.height = 48, g.pattern = "levels";
+    unsigned frames = 25;
+    TheoraEncodeOptions options;
+    std::string toneList;
+    std::vector<std::string> files;
+    std::string error;
+    bool ok = Options(argc, argv, 2, files, [&](const std::string& arg, const char* value) {
+        if (arg == "--size" || arg == "--pattern")
+            return TakeGenerated(g, arg, value);
+        if (!value)
+            return -1;
+        const int number = atoi(value);
+        if (arg == "--frames" && number > 0)
+            frames = static_cast<unsigned>(number);
+        else if (arg == "--fps" && number > 0)
+            options.fpsNumerator = static_cast<unsigned>(number);
+        else if (arg == "--quality" && number >= 0 && number <= 63)
+            options.quality = number;
+        else if (arg == "--tone")
+            toneList = value;
+        else if (arg == "--rate" && number >= 8000 && number <= 192000)
+            options.rate = number;
+        else if (arg == "--channels" && (number == 1 || number == 2))
+            options.channels = number;
+        else if (arg == "--layout" && strcmp(value, "colour") == 0)
+            options.layout = TheoraEncodeOptions::Colour;
+        else if (arg == "--layout" && strcmp(value, "alpha") == 0)
+            options.layout = TheoraEncodeOptions::Alpha;
+        else if (arg == "--layout" && strcmp(value, "stacked") == 0)
+            options.layout = TheoraEncodeOptions::Stacked;
+        else
+            return -2;
+        return 1;
+    }, error);
+    if (!ok)
+        return UsageError(error, kOgvHelp);
+    if (files.size() != 1)
+        return UsageError("ogv needs one output file", kOgvHelp);
+    std::vector<uint32_t> probe;
+    if (!MakeVideoFrame(g.pattern, 1, 1, 0, 1, probe)) {
+        fprintf(stderr, "oxmedia: unknown video pattern %s (known: %s)\n", g.pattern.c_str(), VideoPatternNames());
+        return 2;
+    }
+    std::vector<int16_t> pcm;
+    if (!toneList.empty()) {
+        std::vector<Tone> tones;
+        if (!ParseTones(toneList, static_cast<double>(frames) * options.fpsDenominator / options.fpsNumerator,
+                        options.rate, tones))
+            return UsageError("bad tone", kOgvHelp);
+        for (const Tone& tone : tones) {
+            const auto count = static_cast<size_t>(tone.seconds * options.rate + 0.5);
+            std::vector<int16_t> part =
+                ox::sound::SynthesiseTone(tone.frequency, count, options.channels, options.rate, 0.5, 5.0);
+            pcm.insert(pcm.end(), part.begin(), part.end());
+        }
+        options.pcm = pcm.data();
+        options.pcmFrames = pcm.size() / options.channels;
+    }
+    std::vector<uint8_t> bytes;
+    const auto source = [&](unsigned index, std::vector<uint32_t>& pixels) {
+        MakeVideoFrame(g.pattern, g.width, g.height, index, frames, pixels);
+    };
+    if (!EncodeTheora(g.width, g.height, frames, source, bytes, options) || !Write(files[0], bytes))
+        return 1;
+    printf("%s: %ux%u, %u frames at %u fps%s, %zu bytes\n", files[0].c_str(), g.width, g.height, frames,
+           options.fpsNumerator, pcm.empty() ? "" : " with sound", bytes.size());
+    return 0;
+}
+
 int Info(int argc, char** argv)
 {
     if (argc < 3)
@@ -429,6 +515,11 @@ int Info(int argc, char** argv)
             if ((ok = stream.OpenMemory(data.data(), static_cast<unsigned>(data.size()), path.c_str())))
                 printf("%s: Ogg Vorbis, %d Hz, %s, %.3f s\n", path.c_str(), stream.GetRate(),
                        stream.IsStereo() ? "stereo" : "mono", stream.GetLength());
+        } else if (EndsWith(path, ".ogv")) {
+            ox::graphics::CVideoTrack track;
+            if ((ok = track.OpenMemory(data.data(), data.size(), path.c_str())))
+                printf("%s: Ogg Theora, %ux%u, %u ms\n", path.c_str(), track.Width(), track.Height(),
+                       track.Duration());
         } else if (EndsWith(path, ".bindump")) {
             std::vector<uint32_t> aligned((data.size() + 3) / 4);
             memcpy(aligned.data(), data.data(), data.size());
@@ -466,7 +557,8 @@ int main(int argc, char** argv)
         const char* help;
     } commands[] = {
         {"png", Png, kPngHelp}, {"jpeg", Jpeg, kJpegHelp}, {"pvr", Pvr, kPvrHelp},
-        {"alpha", Alpha, kAlphaHelp}, {"ogg", Ogg, kOggHelp}, {"info", Info, kInfoHelp},
+        {"alpha", Alpha, kAlphaHelp}, {"ogg", Ogg, kOggHelp}, {"ogv", Ogv, kOgvHelp},
+        {"info", Info, kInfoHelp},
     };
     for (const Command& c : commands) {
         if (command != c.name)

@@ -141,3 +141,5 @@ ox.lua.CLua.GetLua("main").LoadScript("scripts/levels.lua")
 ox.lua.CLua.GetLua("main").LoadScript("scripts/records.lua")
 -- The developer window, F12 in the first window at debug level 2.
 ox.lua.CLua.GetLua("main").LoadScript("scripts/devtools.lua")
+-- The intro video before the menu, and the lamp's glow in the level's window.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/intro.lua")

@@ -115,9 +115,9 @@ function LoadingProgress.DoUpdate(self)
     end
     if Menu.done == #Menu.steps then
         Menu.done = Menu.done + 1
-        -- Without a menu the game starts at once.
-        if not Menu.Open(g_Application.GetMainWindow(), "main_menu") then
-            Menu.Play()
+        -- The intro video first when there is one (scripts/intro.lua); the menu follows it.
+        if not (Intro and Intro.Play(g_Application.GetMainWindow(), Menu.OpenMainMenu)) then
+            Menu.OpenMainMenu()
         end
         return false
     end
@@ -129,6 +129,13 @@ function LoadingProgress.DoUpdate(self)
         bar.SetValue(Menu.done / #Menu.steps)
     end
     return false
+end
+
+-- The main menu over the first window; without a menu the game starts at once.
+function Menu.OpenMainMenu()
+    if not Menu.Open(g_Application.GetMainWindow(), "main_menu") then
+        Menu.Play()
+    end
 end
 
 -- Play: StartGame when the game defines one. Else the menu closes and, at the first window's
