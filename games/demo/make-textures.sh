@@ -36,7 +36,7 @@ trap 'rm -rf "$scratch"' EXIT
 # glyph images are declared too; they are made by oxfont (see README.md), not here.
 [ "$out" = "$here" ] || cp -r "$here/fonts" "$out/"
 # The level's pictures are drawn by make-level-art.sh; their masks and sizes are taken here.
-[ "$out" = "$here" ] || cp -r "$here/textures/level" "$out/textures/"
+[ "$out" = "$here" ] || cp -r "$here/textures/level" "$here/textures/level2" "$out/textures/"
 "$tools/oxdump" resources "$here/properties/resources.xml" "$out/properties/resources.bindump" --root "$out" >/dev/null
 "$tools/oxdump" texturesalpha "$out/textures" "$out/properties/texturesalpha.bindump" >/dev/null
 "$tools/oxdump" clips "$here/properties/clips.xml" "$out/properties/clips.bindump" >/dev/null

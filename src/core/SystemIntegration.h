@@ -4,6 +4,7 @@
 #include "core/platform/Event.h"
 #include "misc/Rect.h"
 #include "misc/Vector.h"
+#include "misc/WideChar.h"
 
 #include <string>
 
@@ -56,6 +57,14 @@ public:
     virtual bool IsKeyDown(uint32_t virtualKey) = 0;
     // The platform window the render device draws into (an SDL_Window*); null without one.
     virtual void* GetWindowHandle() { return nullptr; }
+    // The system clipboard's text. False when it holds none or can't be reached (`out` is
+    // then empty); a platform without a clipboard refuses both.
+    virtual bool GetClipboardText(wstring& out)
+    {
+        out.clear();
+        return false;
+    }
+    virtual bool SetClipboardText(const wstring& /*text*/) { return false; }
 
     // Who the loop calls back, and the names the single-instance lock and the window use
     // (the lock lives in the user's data folder of the game).

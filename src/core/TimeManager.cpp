@@ -3,8 +3,10 @@
 #include "diag/Assert.h"
 #include "diag/Log.h"
 
+#include <algorithm>
 #include <chrono>
 #include <cmath>
+#include <cstdlib>
 #include <vector>
 
 namespace ox::core {
@@ -161,14 +163,54 @@ CTimeManager::~CTimeManager()
 
 CTimeManager& CTimeManager::Instance()
 {
-    static CTimeManager* instance = new CTimeManager();
+    static CTimeManager* instance = [] {
+        auto* manager = new CTimeManager();
+        if (const int step = FixedStepFromEnvironment())
+            manager->SetFixedStep(step);
+        return manager;
+    }();
     return *instance;
+}
+
+int CTimeManager::FixedStepFromEnvironment()
+{
+    const char* value = getenv("OX_TEST_CLOCK");
+    if (!value || !*value)
+        return 0;
+    char* end = nullptr;
+    const long step = strtol(value, &end, 10);
+    if (*end || step < 1 || step > kMaxFrameStep) {
+        OX_LOG("core", diag::LogError, "OX_TEST_CLOCK=\"%s\" is no frame step from 1 to %d ms: the real clock runs",
+               value, kMaxFrameStep);
+        return 0;
+    }
+    return static_cast<int>(step);
+}
+
+void CTimeManager::SetFixedStep(int step)
+{
+    m_FixedStep = std::clamp(step, 0, kMaxFrameStep);
+    if (m_FixedStep) {
+        m_Time = 0;
+        g_FrameTime = 0;
+        OX_LOG("core", diag::LogInfo, "Time system runs on the test clock, %d ms a frame", m_FixedStep);
+    } else {
+        // The real clock goes on from here.
+        m_Offset = static_cast<float>(m_Clock.Read()) - static_cast<float>(m_Time);
+    }
 }
 
 CTimeManager& GetTimeManager() { return CTimeManager::Instance(); }
 
 void CTimeManager::Update()
 {
+    if (m_FixedStep) {
+        m_Time += m_FixedStep;
+        g_FrameTime = static_cast<uint32_t>(m_Time);
+        m_Root->Update(m_FixedStep);
+        m_FrameDelta = m_Root->GetFrameDelta();
+        return;
+    }
     float now = static_cast<float>(m_Clock.Read());
     float delta = now - m_Offset - static_cast<float>(m_Time);
     m_Time = static_cast<int32_t>(now - m_Offset);
@@ -184,7 +226,7 @@ void CTimeManager::Pause(bool flag)
 {
     bool wasPaused = m_Root->IsPaused();
     m_Root->Pause(flag);
-    if (wasPaused && !m_Root->IsPaused()) {
+    if (wasPaused && !m_Root->IsPaused() && !m_FixedStep) {
         // Strike out the time spent paused: the clock resumes where it stopped.
         float now = static_cast<float>(m_Clock.Read());
         m_Offset = now - static_cast<float>(m_Time);

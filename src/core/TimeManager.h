@@ -2,6 +2,10 @@
 // Game time: one tree of timers under a root group. The root advances once per frame by the
 // measured frame time, capped at 100 ms. Every timer and group has its own clock, nesting
 // pause count and whole-number speed; a paused group stops everything below it.
+//
+// The test clock: with a fixed frame step every update advances the time by that step,
+// whatever the real clock says, so a run of the same input gives the same frames. The
+// environment variable OX_TEST_CLOCK (milliseconds a frame) turns it on for the process.
 #include "misc/String.h"
 
 #include <cstdint>
@@ -112,8 +116,17 @@ public:
     CTimeManager(const CTimeManager&) = delete;
     CTimeManager& operator=(const CTimeManager&) = delete;
 
-    // The process-wide manager, created at first use and never destroyed.
+    // The process-wide manager, created at first use and never destroyed; on the test clock
+    // when OX_TEST_CLOCK holds a step.
     static CTimeManager& Instance();
+
+    // Every update from now on advances by `step` ms (at most the cap), real time unread; the
+    // manager's time starts over from 0. A step of 0 goes back to the real clock.
+    void SetFixedStep(int step);
+    int GetFixedStep() const { return m_FixedStep; }
+    // The step OX_TEST_CLOCK asks for: 0 when unset; a value that is no step from 1 to the cap
+    // is logged and gives 0.
+    static int FixedStepFromEnvironment();
 
     void Update();
     void Pause(bool flag);
@@ -140,6 +153,7 @@ private:
     int32_t m_Time = 0;
     float m_Offset = 20.0f;
     int32_t m_FrameDelta = 0;
+    int m_FixedStep = 0;
 };
 
 CTimeManager& GetTimeManager();

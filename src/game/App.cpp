@@ -10,6 +10,7 @@
 #include "game/DemoShell.h"
 #include "game/GameBinding.h"
 #include "game/GameOptions.h"
+#include "game/LevelState.h"
 #include "game/LoadWindow.h"
 #include "game/MiniGameWidget.h"
 #include "game/Profile.h"
@@ -32,6 +33,7 @@
 #include "quest/QuestBinding.h"
 #include "quest/QuestData.h"
 #include "quest/SceneWidget.h"
+#include "replay/Replay.h"
 #include "sound/AudioManager.h"
 #include "sound/SoundDeclarations.h"
 
@@ -98,6 +100,7 @@ CApp::CApp() = default;
 
 CApp::~CApp()
 {
+    replay::SetReplayFileStateProbe(nullptr);
     m_Demo.reset();
     core::CFontManager::Instance().SetTextureLookup(nullptr);
     gui::GetGuiServices().findFont = nullptr;
@@ -187,6 +190,8 @@ bool CApp::Init()
     kminigames::RegisterMiniGameWidget(gui::GetWidgetFactory());
     m_Lua = std::make_unique<lua::CLua>("main", true);
     BindScripts();
+    // A check of the replay compares the brief state of the level shown beside the frames.
+    replay::SetReplayFileStateProbe([this] { return HashShownLevelState(m_WidgetManager.GetMainWindow()); });
 
     wstring saves = misc::sys::AppendPath(m_AppDataFolder, u"saves");
     if (!misc::sys::CheckExistPath(saves) && misc::sys::CreateFolder(saves))

@@ -3,10 +3,17 @@
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "game/PlayerFiles.h"
+#include "gui/BaseWindow.h"
 #include "misc/Unicode.h"
 #include "misc/XmlWriter.h"
 #include "quest/Level.h"
 #include "quest/SceneGroup.h"
+#include "quest/SceneWidget.h"
+#include "replay/ReplayCheck.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <vector>
 
 namespace k17 {
 
@@ -25,6 +32,18 @@ void Restore(qe::CLevel& level, const qe::CBaseSceneObject& saved)
     if (const auto* group = dynamic_cast<const qe::CSceneGroup*>(&saved))
         for (const qe::BaseSceneObjectPtrT& child : group->Childs())
             Restore(level, *child);
+}
+
+// The levels of the scene widgets under `widget`, each once, in tree order.
+void CollectShownLevels(const gui::CBaseWidget& widget, std::vector<const qe::CLevel*>& levels)
+{
+    for (const gui::WidgetPtrT& child : widget.GetWidgets()) {
+        const auto* scene = dynamic_cast<const qe::CSceneWidget*>(child.get());
+        const qe::CLevel* level = scene && scene->GetScene() ? scene->GetScene()->GetParentLevel() : nullptr;
+        if (level && std::find(levels.begin(), levels.end(), level) == levels.end())
+            levels.push_back(level);
+        CollectShownLevels(*child, levels);
+    }
 }
 
 } // namespace
@@ -61,6 +80,26 @@ bool RestoreLevelState(qe::CLevel* level, const wstring& path)
             Restore(*level, *area);
     }
     return true;
+}
+
+uint32_t HashShownLevelState(const gui::CBaseWindow* window)
+{
+    std::vector<const qe::CLevel*> levels;
+    for (; window; window = window->GetChildWindow())
+        CollectShownLevels(*window, levels);
+    if (levels.empty())
+        return 0;
+    misc::CXmlWriter writer(true);
+    {
+        misc::CXmlElement root(writer, "save");
+        for (const qe::CLevel* level : levels)
+            level->Save(root, true);
+    }
+    void* text = nullptr;
+    unsigned size = 0;
+    const uint32_t hash = writer.GetBuffer(&text, &size) ? replay::HashBytes(text, size) : 0;
+    free(text);
+    return hash;
 }
 
 } // namespace k17

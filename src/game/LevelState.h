@@ -4,6 +4,11 @@
 // quest data, so a game continues where the player left it.
 #include "misc/WideChar.h"
 
+#include <cstdint>
+
+namespace ox::gui {
+class CBaseWindow;
+}
 namespace qe {
 class CLevel;
 }
@@ -17,5 +22,10 @@ bool SaveLevelState(const qe::CLevel* level, const ox::wstring& path);
 // `level` found by id the saved object flags, hint and colour. False (logged) when there is
 // no save or it holds no such level; objects the save does not know keep their state.
 bool RestoreLevelState(qe::CLevel* level, const ox::wstring& path);
+
+// One hash of the brief forms of the levels whose scenes the windows from `window` up its
+// child windows show, each level once, in the order met: the state a replay check compares.
+// 0 when no level is shown.
+uint32_t HashShownLevelState(const ox::gui::CBaseWindow* window);
 
 } // namespace k17

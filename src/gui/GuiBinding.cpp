@@ -7,6 +7,7 @@
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
 #include "gui/controls/ClipWidget.h"
+#include "gui/controls/EditWidget.h"
 #include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 #include "gui/controls/LabelWidget.h"
@@ -18,6 +19,7 @@
 #include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolTipHelperWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 #include "gui/Window.h"
 #include "gui/WidgetManager.h"
 #include "lua/Lua.h"
@@ -354,6 +356,37 @@ void AddCast(mluabind::Namespace& ns, const char* name)
     ns.AddFunction(mluabind::Function(name, [](CBaseWidget* widget) { return dynamic_cast<W*>(widget); }));
 }
 
+void BindEditWidget(mluabind::Namespace& ns)
+{
+    using E = CEditWidget;
+    ns.AddClass(Class<E>("CEditWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("SetEditColors", &E::SetEditColors)
+                    .Method("SelectText", &E::SelectText)
+                    .Method("SetText", &E::SetText)
+                    .Method("GetText", &E::GetText)
+                    .Method("SetTextJustification", &E::SetTextJustification)
+                    .Method("SetMaxChars", &E::SetMaxChars)
+                    .Method("OnTextChanged", &E::OnTextChanged));
+    AddCast<E>(ns, "CEditWidget.Cast");
+}
+
+// The composite controls: tabs.
+void BindComposites(mluabind::Namespace& ns)
+{
+    using T = CTabWidget;
+    ns.AddClass(Class<T>("CTabWidget")
+                    .BaseClass<CWidget>()
+                    .Constructor<>()
+                    .Method("EnumPanels", &T::EnumPanels)
+                    .Method("SelectPanel", &T::SelectPanel)
+                    .Method("GetSelectedPanel", &T::GetSelectedPanel)
+                    .Method("GetPanelContent", static_cast<CWidget* (T::*)(int) const>(&T::GetPanelContent))
+                    .Method("GetPanelContent", static_cast<CWidget* (T::*)(const wstring&) const>(&T::GetPanelContent)));
+    AddCast<T>(ns, "CTabWidget.Cast");
+}
+
 void BindControls(mluabind::Namespace& ns)
 {
     ns.AddClass(ImageWidgetClass());
@@ -397,6 +430,7 @@ void BindControls(mluabind::Namespace& ns)
     AddCast<CToolbarWidget>(ns, "CToolbarWidget.Cast");
     AddCast<CImageBoxWidget>(ns, "CImageBoxWidget.Cast");
     AddCast<CWindow>(ns, "CWindow.Cast");
+    BindEditWidget(ns);
 }
 
 constexpr NamedValue kListColors[] = {
@@ -502,6 +536,7 @@ mluabind::Namespace BindGui()
     ns.AddFunction(mluabind::Function("g_Cursor.Instance", &CCursor::Instance));
     ns.AddClass(Class<CWidgetManager>("CWidgetManager").Method("GetKeyboardState", &CWidgetManager::GetKeyboardState));
     BindEffects(ns);
+    BindComposites(ns);
     BindControls(ns);
     BindValueControls(ns);
     return ns;

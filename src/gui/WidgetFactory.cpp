@@ -4,6 +4,7 @@
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
 #include "gui/controls/ClipWidget.h"
+#include "gui/controls/EditWidget.h"
 #include "gui/controls/ImageBoxWidget.h"
 #include "gui/controls/ImageWidget.h"
 #include "gui/controls/LabelWidget.h"
@@ -14,6 +15,7 @@
 #include "gui/controls/ScrollWidget.h"
 #include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolbarWidget.h"
+#include "gui/controls/TabWidget.h"
 
 namespace ox::gui {
 
@@ -75,6 +77,8 @@ void RegisterFrameworkWidgets(CWidgetFactory& factory)
     factory.RegisterWidget<CListWidget>("list_widget");
     factory.RegisterWidget<CComboBoxWidget>("combobox_widget");
     factory.RegisterWidget<CSliderWidget>("slider_widget");
+    factory.RegisterWidget<CEditWidget>("edit_widget");
+    factory.RegisterWidget<CTabWidget>("tab_widget");
 }
 
 } // namespace ox::gui

@@ -313,4 +313,10 @@ void SetReplayFileCheck(std::string game, CheckProbes probes, uint32_t step)
     CPlayback::Instance().SetCheck(check);
 }
 
+void SetReplayFileStateProbe(std::function<uint32_t()> probe)
+{
+    if (CReplayCheck* check = CPlayback::Instance().GetCheck())
+        check->SetStateProbe(std::move(probe));
+}
+
 } // namespace ox::replay

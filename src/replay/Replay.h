@@ -131,5 +131,7 @@ private:
 void ToggleReplayFile();
 // The game's name and probes for the check of "replay", a moment every `step` ms.
 void SetReplayFileCheck(std::string game, CheckProbes probes, uint32_t step = 1000);
+// The state the check of "replay" hashes beside the frames (a game gives its level's).
+void SetReplayFileStateProbe(std::function<uint32_t()> probe);
 
 } // namespace ox::replay

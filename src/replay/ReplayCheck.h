@@ -42,6 +42,8 @@ public:
     enum Mode { Idle, Writing, Checking };
 
     CReplayCheck(std::string game, CheckProbes probes);
+    // The game's state for the moments to come (empty: 0).
+    void SetStateProbe(std::function<uint32_t()> probe) { m_Probes.state = std::move(probe); }
 
     // Notes moments, saved at Finish when a path is given. `events` is the hash of the
     // recording the moments belong to.

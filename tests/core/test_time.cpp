@@ -120,3 +120,43 @@ TEST(TimeManager, LookupsCloneAndRemoval)
     t.manager.RemoveGroupTimer(named); // unknown: nothing happens
     t.Frame(10);
 }
+
+TEST(TimeManager, TheTestClockStepsByItsFixedStepWhateverTheRealClockDoes)
+{
+    Clocked t;
+    const unsigned app = t.manager.GetAppTime();
+    t.manager.SetFixedStep(20);
+    EXPECT_EQ(t.manager.GetTime(), 0) << "the test clock starts over from 0";
+    t.Frame(0);
+    t.Frame(5000);
+    t.Frame(3);
+    EXPECT_EQ(t.manager.GetTime(), 60);
+    EXPECT_EQ(t.manager.GetAppTime(), app + 60);
+    EXPECT_EQ(t.manager.GetFrameDelta(), 20);
+    EXPECT_EQ(g_FrameTime, 60u);
+    t.manager.Pause(true);
+    t.Frame(40);
+    t.manager.Pause(false);
+    EXPECT_EQ(t.manager.GetAppTime(), app + 60) << "a paused root stands still on the test clock too";
+    t.Frame(7);
+    EXPECT_EQ(t.manager.GetAppTime(), app + 80);
+    // Back on the real clock the next step is the real time since the last update.
+    t.manager.SetFixedStep(0);
+    t.Frame(16);
+    EXPECT_EQ(t.manager.GetFrameDelta(), 16);
+    EXPECT_EQ(t.manager.GetTime(), 116);
+}
+
+TEST(TimeManager, TheTestClockIsReadFromTheEnvironment)
+{
+    {
+        oxtest::ScopedEnv env("OX_TEST_CLOCK", "25");
+        EXPECT_EQ(CTimeManager::FixedStepFromEnvironment(), 25);
+    }
+    for (const char* bad : {"0", "fast", "20ms", "101", "-5"}) {
+        oxtest::ScopedEnv env("OX_TEST_CLOCK", bad);
+        EXPECT_EQ(CTimeManager::FixedStepFromEnvironment(), 0) << bad;
+    }
+    oxtest::ScopedEnv env("OX_TEST_CLOCK", "");
+    EXPECT_EQ(CTimeManager::FixedStepFromEnvironment(), 0);
+}

@@ -1,6 +1,8 @@
 // The demo's recorded play-through: games/demo/replay is what the steps below make (this test
 // makes it again and compares; OX_WRITE_DEMO_REPLAY=1 rewrites it), and played back in the
 // real game, headless, in place of live input, it plays the level from the main menu to its end.
+// On the test clock every run of it draws the same frames, which its check file holds.
+#include "core/TimeManager.h"
 #include "core/platform/StandaloneApplicationSdl.h"
 #include "game/App.h"
 #include "gui/Window.h"
@@ -8,14 +10,11 @@
 #include "quest/QuestServices.h"
 #include "misc/Unicode.h"
 #include "replay/Replay.h"
+#include "DemoChild.h"
 #include "support/TestSupport.h"
 
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <chrono>
-#include <csignal>
-#include <thread>
+#include <fstream>
+#include <sstream>
 
 namespace fs = std::filesystem;
 using namespace ox;
@@ -65,14 +64,17 @@ bool MakeRecording(const fs::path& path)
     return record.SaveEvents(misc::Utf8ToWide(path.string()).c_str());
 }
 
-// The game in this process: to the main menu, then the file "replay" by the replay key's
-// action. Exit codes above 0 say where it went wrong.
+// The game in this process on the test clock, as fast as it goes: to the main menu, then the
+// file "replay" by the replay key's action, checked against "replay.check" or writing it.
+// Prints the check's result. Exit codes above 0 say where it went wrong.
 int PlayTheRecording()
 {
+    core::GetTimeManager().SetFixedStep(20);
     k17::CApp app;
     app.ReadGameFolder();
     if (!app.Init())
         return 10;
+    app.LimitFPS(0);
     gui::BaseWindowPtrT loading = app.CreateLoadWindow();
     app.SetMainWindow(loading);
     auto* adapter = dynamic_cast<core::CStandaloneApplicationSdl*>(app.GetSystemIntegration());
@@ -82,7 +84,6 @@ int PlayTheRecording()
         adapter->PumpMessages();
         app.Update();
         app.Draw();
-        std::this_thread::sleep_for(std::chrono::milliseconds(5));
     };
     // The main menu, come to rest, with no click script of the level running.
     misc::FloatVector centre, last {-1, -1};
@@ -115,10 +116,38 @@ int PlayTheRecording()
         frame(); // the level window runs its frames inside one of these
     for (int i = 0; i < 20; ++i)
         frame();
+    const replay::CReplayCheck* check = replay::CPlayback::Instance().GetCheck();
+    if (!check)
+        return 14;
+    const std::string& difference = check->GetFirstDifference();
+    printf("replay check: %s, %zu moments, first difference: %s\n",
+           check->GetMode() == replay::CReplayCheck::Checking ? "checked" : "written", check->GetMoments().size(),
+           difference.empty() ? "none" : difference.c_str());
     app.Stop();
     loading.reset();
     app.DoShutdown();
     return 0;
+}
+
+// "moment <n> at <t> ms" of the first moment of a check file with a level's state in it.
+std::string FirstLevelMoment(const std::string& check)
+{
+    std::istringstream in(check);
+    std::string line, frame, state;
+    for (int header = 0; header < 4; ++header)
+        std::getline(in, line);
+    uint32_t time = 0;
+    for (int n = 1; in >> time >> frame >> state; ++n)
+        if (state != "00000000")
+            return "moment " + std::to_string(n) + " at " + std::to_string(time) + " ms";
+    return {};
+}
+
+// The line the last run printed about its check.
+std::string CheckLine(const std::string& output)
+{
+    const size_t at = output.rfind("replay check: ");
+    return at == std::string::npos ? std::string() : output.substr(at, output.find('\n', at) - at);
 }
 
 } // namespace
@@ -135,35 +164,14 @@ TEST(DemoReplay, TheRecordingIsWhatThePlayThroughsStepsMake)
         << "games/demo/replay differs from what this test makes: run it with OX_WRITE_DEMO_REPLAY=1";
 }
 
-TEST(DemoReplay, TheRecordedPlayThroughFinishesTheLevelHeadless)
+TEST(DemoReplay, ThePlayThroughEndsTheLevelTheSameEveryRunAndAChangedLevelReportsItsFirstDifference)
 {
-    oxtest::TempDir dir;
-    const fs::path game = dir / "demo";
-    fs::copy(OX_DEMO_GAME, game, fs::copy_options::recursive);
-    fs::remove(game / "replay.check");
-    fs::create_directories(dir / "xdg");
-    const pid_t pid = fork();
-    if (pid == 0) {
-        signal(SIGALRM, [](int) {
-            fflush(stdout);
-            _exit(99);
-        });
-        alarm(90);
-        setenv("XDG_DATA_HOME", (dir / "xdg").c_str(), 1);
-        setenv("SDL_VIDEODRIVER", "offscreen", 1);
-        setenv("ALSOFT_DRIVERS", "null", 1);
-        if (chdir(game.c_str()) != 0)
-            _exit(101);
-        const int result = PlayTheRecording();
-        fflush(stdout);
-        _exit(result);
-    }
-    int status = 0;
-    ASSERT_EQ(waitpid(pid, &status, 0), pid);
-    const std::string output = oxtest::ReadFile(game / "k17_stdout.txt");
-    const std::string errors = oxtest::ReadFile(game / "k17_stderr.txt");
-    ASSERT_TRUE(WIFEXITED(status)) << "signal " << WTERMSIG(status) << "\n" << output << errors;
-    ASSERT_EQ(WEXITSTATUS(status), 0) << output << errors;
+    oxtest::DemoChild demo;
+    fs::remove(demo.game / "replay.check");
+    const int result = demo.Run(&PlayTheRecording, 90);
+    const std::string output = demo.Output();
+    const std::string errors = demo.Errors();
+    ASSERT_EQ(result, 0) << output << errors;
     size_t at = 0;
     for (const char* line :
          {"Lantern Demo: the scene garden", "Lantern Demo: found coin (1/9)", "Lantern Demo: the key opens the chest",
@@ -174,7 +182,27 @@ TEST(DemoReplay, TheRecordedPlayThroughFinishesTheLevelHeadless)
         at = found + 1;
     }
     EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
-    // The first playback wrote the check file of the recording.
-    const std::string check = oxtest::ReadFile(game / "replay.check");
+    // The first playback wrote the check file of the recording, a moment a second.
+    const std::string check = oxtest::ReadFile(demo.game / "replay.check");
     EXPECT_EQ(check.rfind("oxreplaycheck 1\ngame Lantern Demo\nevents ", 0), 0u) << check;
+    EXPECT_EQ(CheckLine(output), "replay check: written, 11 moments, first difference: none") << check;
+    // On the test clock a second run draws the same frames at the same moments.
+    ASSERT_EQ(demo.Run(&PlayTheRecording, 90), 0) << demo.Output() << demo.Errors();
+    EXPECT_EQ(CheckLine(demo.Output()), "replay check: checked, 11 moments, first difference: none") << check;
+
+    // One object's hint changed in the level's data: the first moment that shows the level
+    // reports its state, though the frame is the same.
+    const fs::path quest = demo.game / "properties" / "quest.xml";
+    std::string data = oxtest::ReadFile(quest);
+    const std::string shell = "id=\"shell\" object_flags=\"0\" hint=\"$307\"";
+    const size_t found = data.find(shell);
+    ASSERT_NE(found, std::string::npos) << "the demo's shell has another hint now: change this test";
+    data.replace(found, shell.size(), "id=\"shell\" object_flags=\"0\" hint=\"$306\"");
+    std::ofstream(quest, std::ios::binary | std::ios::trunc) << data;
+    const std::string first = FirstLevelMoment(check);
+    ASSERT_FALSE(first.empty()) << "no moment shows the level:\n" << check;
+    ASSERT_EQ(demo.Run(&PlayTheRecording, 90), 0) << demo.Output() << demo.Errors();
+    EXPECT_EQ(CheckLine(demo.Output()).rfind("replay check: checked, 11 moments, first difference: " + first +
+                                             ": the level state differs (", 0), 0u)
+        << CheckLine(demo.Output()) << "\n" << check;
 }

@@ -129,8 +129,8 @@ TEST_F(StartRoad, TheDemoRunFolderGetsItsPicturesFromOurScript)
     const std::string command = std::string("sh '") + OX_DEMO_GAME + "/stage-run.sh' '" + OX_TOOLS_DIR + "' '" +
                                 out.string() + "' > '" + (dir / "log.txt").string() + "' 2>&1";
     ASSERT_EQ(WEXITSTATUS(system(command.c_str())), 0) << oxtest::ReadFile(dir / "log.txt");
-    EXPECT_TRUE(fs::exists(out / "game.xml"));
-    EXPECT_TRUE(fs::exists(out / "scripts/main.lua"));
+    // The game's files are packed (tests/game/test_demo_shipping.cpp starts them).
+    EXPECT_TRUE(fs::exists(out / "game.pack"));
     // What the branch makes of that folder: the two splash screens, then the logo.
     oxtest::ScopedCwd cwd(out);
     k17::CBranch branch(misc::Utf8ToWide(out.string()));

@@ -203,6 +203,9 @@ V.controls = {
                           ListColorSelection = 3 },
         },
         ["ox.gui.CSliderWidget"] = { "SetValue", "GetValue", "OnValueChanged" },
+        ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
+                                   "SetMaxChars", "OnTextChanged" },
+        ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
     },
 }
 
@@ -221,11 +224,8 @@ V.pending = {
     },
     widgets = {
         classes = {
-            ["ox.gui.CEditWidget"] = { "SetEditColors", "SelectText", "SetText", "GetText", "SetTextJustification",
-                                       "SetMaxChars", "OnTextChanged" },
             ["ox.gui.CTableWidget"] = { "GetCell", "LoadRow", "FitCells", "GetCellsCount", "ClearTable", "SelectRow",
                                         "GetSelectedRow" },
-            ["ox.gui.CTabWidget"] = { "EnumPanels", "SelectPanel", "GetSelectedPanel", GetPanelContent = 2 },
             ["ox.gui.CTreeWidget"] = {},
         },
     },

@@ -1,5 +1,7 @@
 #include "support/FakePlatform.h"
 
+#include "misc/Unicode.h"
+
 #include <algorithm>
 #include <cstring>
 #include <iterator>
@@ -104,6 +106,20 @@ bool FakePlatform::SetScreenMode(bool full, bool bpp32, unsigned width, unsigned
     // Full screen covers the desktop, whatever size was asked, as the real adapter's does.
     client = full ? IntRect {0, 0, static_cast<int>(desktopWidth), static_cast<int>(desktopHeight)}
                   : IntRect {0, 0, static_cast<int>(width), static_cast<int>(height)};
+    return true;
+}
+
+bool FakePlatform::GetClipboardText(ox::wstring& out)
+{
+    out = clipboardRefuses || clipboard.empty() ? ox::wstring() : ox::misc::Utf8ToWide(clipboard);
+    return !out.empty();
+}
+
+bool FakePlatform::SetClipboardText(const ox::wstring& text)
+{
+    if (clipboardRefuses)
+        return false;
+    clipboard = ox::misc::WideToUtf8(text);
     return true;
 }
 
@@ -259,6 +275,11 @@ void SendClick(FakePlatform& platform, int x, int y, uint8_t button, uint8_t cli
     SendMove(platform, x, y);
     DeliverButton(platform, x, y, button, clicks, true);
     DeliverButton(platform, x, y, button, clicks, false);
+}
+
+void SendButton(FakePlatform& platform, bool down, uint8_t button)
+{
+    DeliverButton(platform, platform.mouse.X, platform.mouse.Y, button, 1, down);
 }
 
 void SendKey(FakePlatform& platform, SDL_Scancode key, uint16_t modifiers)

@@ -47,6 +47,10 @@ public:
     std::string product, windowTitle, lockFolder;
     bool mouseCaptured = false;
     int captures = 0;   // CaptureMouse(true) calls
+    // The clipboard, as the system holds it (UTF-8, which may be invalid); a refusing one
+    // neither gives nor takes text.
+    std::string clipboard;
+    bool clipboardRefuses = false;
     // A nested loop (a modal window) runs this once a frame until StopNested, at most 1000
     // times; without it RunNested returns at once.
     std::function<void()> nestedFrame;
@@ -104,6 +108,8 @@ public:
     }
     bool IsKeyDown(uint32_t virtualKey) override;
     void* GetWindowHandle() override { return windowHandle; }
+    bool GetClipboardText(ox::wstring& out) override;
+    bool SetClipboardText(const ox::wstring& text) override;
     void SetClient(ox::core::IPlatformClient* client) override { m_Client = client; }
     void SetIdentity(const std::string& product, const std::string& windowTitle,
                      const std::string& lockFolder) override;
@@ -120,6 +126,8 @@ void SendMove(FakePlatform& platform, int x, int y);
 void SendClick(FakePlatform& platform, int x, int y, uint8_t button = SDL_BUTTON_LEFT, uint8_t clicks = 1);
 // A key pressed and released with the modifiers held (KMOD_* flags), on a US layout.
 void SendKey(FakePlatform& platform, SDL_Scancode key, uint16_t modifiers = KMOD_NONE);
+// A button pressed or released where the mouse is; a move between a press and a release drags.
+void SendButton(FakePlatform& platform, bool down, uint8_t button = SDL_BUTTON_LEFT);
 // Typed text (UTF-8), as the platform's text input delivers it.
 void SendText(FakePlatform& platform, const std::string& text);
 

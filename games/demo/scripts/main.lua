@@ -20,16 +20,17 @@ function Init()
           (lfs and "present" or "missing"))
 end
 
--- Once loading is over, level1 is built from the quest data and started in a Lua host of its
+-- Once loading is over, the level (lantern.level_id, level1 at first) is built from the quest data and started in a Lua host of its
 -- own, listed as qe_level. From there scripts/game_engine/quest.lua runs the level: its script
 -- threads, on the clock of the group "level" under "main", and its objects' scripts.
 function StartLevel()
     if lantern.level then
         return
     end
-    local level = qe.g_QuestData.Instance().CreateLevel("level1")
+    local id = lantern.level_id or "level1"
+    local level = qe.g_QuestData.Instance().CreateLevel(id)
     if not level then
-        print("Lantern Demo: the quest data has no level1")
+        print("Lantern Demo: the quest data has no " .. id)
         return
     end
     lantern.level = qe.CLevelPtrT(level)
@@ -39,10 +40,10 @@ function StartLevel()
         objects = objects + scenes.Get().EnumObjects() + scenes.Get().EnumAreas()
         scenes.Next()
     end
-    print("Lantern Demo: level1 built from the quest data: " .. lantern.level.EnumScenes() .. " scenes, " ..
+    print("Lantern Demo: " .. id .. " built from the quest data: " .. lantern.level.EnumScenes() .. " scenes, " ..
           objects .. " objects")
     lantern.level_lua = lantern.level_lua or ox.lua.CLua("qe_level", true)
-    local started = qe.StartLevel(lantern.level_lua, nil, level, "level1", nil,
+    local started = qe.StartLevel(lantern.level_lua, nil, level, id, nil,
                                   "print('Lantern Demo: the init script runs')", "The Lantern", "", false)
     print("Lantern Demo: qe.StartLevel gave " .. started)
 end
@@ -134,3 +135,5 @@ ox.lua.CLua.GetLua("main").LoadScript("scripts/engine_tour.lua")
 ox.lua.CLua.GetLua("main").LoadScript("scripts/minigame.lua")
 -- Achievements: awarded in the level, shown from the main menu.
 ox.lua.CLua.GetLua("main").LoadScript("scripts/achievements.lua")
+-- The order of the levels: Play continues with the player's next level.
+ox.lua.CLua.GetLua("main").LoadScript("scripts/levels.lua")

@@ -153,7 +153,12 @@ function Menu.PlayLevel()
         return
     end
     say("the level's window opens")
-    say("the level's window closed with " .. main.DoModal(window))
+    local result = main.DoModal(window)
+    say("the level's window closed with " .. result)
+    -- Everything found: the next level waits for Play (scripts/levels.lua).
+    if result == 1 and Levels then
+        Levels.Finished()
+    end
     Menu.Open(main, "main_menu")
 end
 

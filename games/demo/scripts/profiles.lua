@@ -43,7 +43,8 @@ function Profiles.SaveLevel()
     if not (player and lantern and lantern.level) then
         return
     end
-    player.SetStep("level1")
+    local id = lantern.level_id or "level1"
+    player.SetStep(id)
     player.SetStepType(k17.GameStepTypeLevel)
     if player.GetLevelState() == k17.LevelStateTypeNew then
         player.SetLevelState(k17.LevelStateTypeInGame)
@@ -65,10 +66,12 @@ function Profiles.RestoreLevel()
         player.SetGameGUID(k17.misc.CreateGUIDString())
     end
     Profiles.started = os.time()
-    if S(player.GetStep()) == "level1" and demo.RestoreLevelState(lantern.level.get(), player.GetSaveFileName()) then
-        print("Lantern Demo: " .. S(player.GetName()) .. " goes on where they left level1")
+    local id = lantern.level_id or "level1"
+    if S(player.GetStep()) == id and player.GetLevelState() ~= k17.LevelStateTypeNew and
+            demo.RestoreLevelState(lantern.level.get(), player.GetSaveFileName()) then
+        print("Lantern Demo: " .. S(player.GetName()) .. " goes on where they left " .. id)
     else
-        print("Lantern Demo: " .. S(player.GetName()) .. " starts level1")
+        print("Lantern Demo: " .. S(player.GetName()) .. " starts " .. id)
     end
 end
 
@@ -113,7 +116,7 @@ function Profiles.LevelFinished()
     local place = records().AddRecord(player, score)
     records().Save()
     Profiles.SaveLevel()
-    print("Lantern Demo: level1 finished by " .. S(player.GetName()) .. " with " .. score .. " points, place " .. place)
+    print("Lantern Demo: " .. (lantern.level_id or "level1") .. " finished by " .. S(player.GetName()) .. " with " .. score .. " points, place " .. place)
     Profiles.OpenRecords()
 end
 

@@ -3,6 +3,7 @@
 #include "diag/Assert.h"
 #include "diag/Log.h"
 #include "misc/String.h"
+#include "misc/sys/Clipboard.h"
 
 #include <fcntl.h>
 #include <sys/file.h>
@@ -318,6 +319,17 @@ bool CStandaloneApplicationSdl::IsKeyDown(uint32_t virtualKey)
             return true;
     }
     return false;
+}
+
+bool CStandaloneApplicationSdl::GetClipboardText(wstring& out)
+{
+    out.clear();
+    return m_VideoReady && misc::sys::GetClipboardText(out);
+}
+
+bool CStandaloneApplicationSdl::SetClipboardText(const wstring& text)
+{
+    return m_VideoReady && misc::sys::SetClipboardText(text);
 }
 
 TranslationState CStandaloneApplicationSdl::CurrentState(const SDL_Event& event)

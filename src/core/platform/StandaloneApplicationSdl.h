@@ -50,6 +50,9 @@ public:
 
     SDL_Window* GetWindow() const { return m_Wnd; }
     void* GetWindowHandle() override { return m_Wnd; }
+    // SDL's clipboard, which needs the window: refused before Init.
+    bool GetClipboardText(wstring& out) override;
+    bool SetClipboardText(const wstring& text) override;
     bool IsStopRequested() const { return m_StopRequested; }
     // The last CheckSingleInstance found another instance running.
     bool IsSecondInstance() const { return m_SecondInstance; }
