@@ -29,6 +29,8 @@ trap 'rm -rf "$scratch"' EXIT
 "$tools/oxmedia" png "$out/textures/menu_bar.png" --size 400x12 --pattern gradient
 "$tools/oxmedia" png "$out/textures/menu_back.png" --size 64x64 --pattern gradient
 "$tools/oxmedia" png "$out/textures/menu_tip_back.png" --size 16x16 --pattern checker
+# The arrow of the options' combo box and of scroll bars: four 24 x 24 states side by side.
+"$tools/oxmedia" png "$out/textures/menu_arrow.png" --size 96x24 --pattern gradient
 
 # The declarations read image sizes from the files, so they come after the images. The fonts'
 # glyph images are declared too; they are made by oxfont (see README.md), not here.

@@ -17,7 +17,8 @@ TEST(DemoContent, TexturesAndDumpsRegenerateByteForByte)
     const char* files[] = {"textures/demo_spinner.png", "textures/demo_disc.png", "textures/demo_frame.png",
                            "textures/demo_stone.pvr", "textures/menu_button.png", "textures/menu_box.png",
                            "textures/menu_tick.png", "textures/menu_bar_frame.png", "textures/menu_bar.png",
-                           "textures/menu_back.png", "textures/menu_tip_back.png", "properties/resources.bindump",
+                           "textures/menu_back.png", "textures/menu_tip_back.png", "textures/menu_arrow.png",
+                           "properties/resources.bindump",
                            "properties/texturesalpha.bindump", "properties/clips.bindump",
                            "properties/particles.bindump"};
     for (const char* file : files) {

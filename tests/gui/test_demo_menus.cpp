@@ -1,13 +1,16 @@
 // The demo game's menus as a player meets them: its own menu script and window descriptions,
 // under a stand-in for the application and the game's options. The loading bar fills, the
-// main menu fades in, Options shows and applies the player's choices, Play starts the game.
+// main menu fades in, Options shows the player's choices, sets the volumes as their sliders
+// move and applies the rest with OK, Play starts the game.
 #include "gui/ControlTestSupport.h"
 #include "gui/GuiBinding.h"
 #include "gui/WidgetManager.h"
 #include "gui/controls/ButtonWidget.h"
 #include "gui/controls/CheckboxWidget.h"
+#include "gui/controls/ComboBoxWidget.h"
 #include "gui/controls/ProgressBarWidget.h"
 #include "gui/controls/RadioButtonGroupWidget.h"
+#include "gui/controls/SliderWidget.h"
 #include "gui/controls/ToolTipHelperWidget.h"
 #include "lua/Lua.h"
 #include "lua/LuaBinding.h"
@@ -83,6 +86,12 @@ struct DemoMenus : oxtest::ControlFixture {
                function options.SetFullScreenMode(on) table.insert(told, "full " .. tostring(on)) end
                function options.SetDificultyLevel(level) table.insert(told, "level " .. level) end
                function options.ApplyOptionsChanges() table.insert(told, "apply") end
+               local volumes = { Music = 60, Sound = 70, Voice = 50 }
+               for name in pairs(volumes) do
+                   options["Get" .. name .. "Volume"] = function() return volumes[name] end
+                   options["Set" .. name .. "Volume"] = function(v) table.insert(told, name .. " " .. v) end
+               end
+               function options.ApplyMusicChanges() table.insert(told, "volumes") end
                function options.UpdateLocalSettings() table.insert(told, "update") end
                function options.Save() table.insert(told, "save") end
                k17 = { g_GameOptions = { Instance = function() return options end } })");
@@ -139,14 +148,20 @@ TEST_F(DemoMenus, BarFillsThenTheMenuLeadsToOptionsAndPlay)
     Press(menu, "options");
     CBaseWindow* options = menu->GetChildWindow();
     ASSERT_NE(options, nullptr);
-    auto* full = Find<CCheckboxWidget>(options, "fullscreen");
+    auto* screen = Find<CComboBoxWidget>(options, "screen_mode");
     auto* level = Find<CRadioButtonGroupWidget>(options, "difficulty");
-    ASSERT_TRUE(full && level);
-    EXPECT_TRUE(full->IsChecked()) << "the player's options show";
+    auto* music = Find<CSliderWidget>(options, "music");
+    ASSERT_TRUE(screen && level && music);
+    EXPECT_EQ(screen->GetSelectedLine(), 1) << "the player's options show";
     EXPECT_EQ(level->GetChecked(), 1);
-    full->Check(false, true);
+    EXPECT_FLOAT_EQ(music->GetValue(), 0.6f);
+    EXPECT_FLOAT_EQ(Find<CSliderWidget>(options, "voice")->GetValue(), 0.5f);
+    // A volume changes as its slider moves; the screen mode waits for OK.
+    music->SetValue(0.25f, true);
+    screen->SelectLine(0, true);
+    EXPECT_EQ(Eval("table.concat(told, ';')"), "Music 25;volumes");
     Press(options, "ok");
-    EXPECT_EQ(Eval("table.concat(told, ';')"), "full false;level 1;apply;update;save");
+    EXPECT_EQ(Eval("table.concat(told, ';')"), "Music 25;volumes;full false;level 1;apply;volumes;update;save");
     manager.Update();
     EXPECT_EQ(menu->GetChildWindow(), nullptr) << "OK closes the options";
 

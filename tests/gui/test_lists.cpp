@@ -38,6 +38,7 @@ const char* kTemplates = R"(
     <list_template id="l" font="mono" scroll_template="v" background="frame" sound_on_select="pick"
                    color_text_normal="#255 255 255 255" color_text_selected="#255 255 255 0"
                    color_text_over="#255 0 255 255" color_selection="#255 0 0 128"/>
+    <list_template id="bare" background="frame"/>
     <button_template id="arrow" image="strip"/>
     <label_template id="text" font="mono"/>
     <combobox_template id="c" button_template="arrow" label_template="text" list_template="l" back_image="frame"
@@ -353,7 +354,8 @@ TEST_F(ListsTest, ListShowsItsScrollBarWhenTheLinesFillItAndSelectsItsFirstLine)
             <list_widget id="short" list_template="l" x="300" y="0" width="200" height="100" abs_pos="true" selected="2">
               <strings><string text="a"/><string text="b"/><string text="c"/><string text="ab"/></strings>
             </list_widget>
-            <list_widget id="tall" list_template="l" list_height="0" x="600" y="0" abs_pos="true"/>)");
+            <list_widget id="tall" list_template="l" list_height="0" x="600" y="0" abs_pos="true"/>
+            <list_widget id="bare" list_template="bare" x="800" y="0" width="50" height="50" abs_pos="true"/>)");
     const Strings told = window->Take();
     EXPECT_EQ(std::count(told.begin(), told.end(), "line_selected full"), 1);
     EXPECT_EQ(std::count(told.begin(), told.end(), "line_selected short"), 1);
@@ -373,6 +375,11 @@ TEST_F(ListsTest, ListShowsItsScrollBarWhenTheLinesFillItAndSelectsItsFirstLine)
     EXPECT_EQ(few.GetScrollValue(), 0) << "no value while the bar is off";
     // list_height 0 asks for 5 lines: 100 high, as wide as the background image.
     EXPECT_EQ(Get<CListWidget>("tall").GetSize(), FloatVector(100, 100));
+    // Without a font no line can be added, and the description is blamed.
+    auto& bare = Get<CListWidget>("bare");
+    bare.AddLine(u"ab");
+    EXPECT_EQ(bare.EnumLines(), 0);
+    EXPECT_TRUE(appLog->Contains("a list without a font"));
 
     // Lines: out of range ignored, the first of two equal ones found, hover over selected.
     few.AddLine(u"ab");

@@ -191,7 +191,8 @@ function MainMenu.OnChildAction(self, action, sender)
     return true
 end
 
--- The options: what the player's options hold when the window opens, applied with OK.
+-- The options: what the player's options hold when the window opens. The volumes change as
+-- their sliders move, so that the player hears them; OK applies the screen mode and saves.
 OptionsWindow = OptionsWindow or {}
 
 local function options()
@@ -201,36 +202,65 @@ local function options()
     return nil
 end
 
+-- The sliders of the volumes, by id, and the option each one sets.
+local volumes = {
+    music = { get = "GetMusicVolume", set = "SetMusicVolume" },
+    sound = { get = "GetSoundVolume", set = "SetSoundVolume" },
+    voice = { get = "GetVoiceVolume", set = "SetVoiceVolume" },
+}
+
 local function controls(window)
-    return ox.gui.CCheckboxWidget.Cast(window.GetWidget("fullscreen", true)),
+    return ox.gui.CComboBoxWidget.Cast(window.GetWidget("screen_mode", true)),
            ox.gui.CRadioButtonGroupWidget.Cast(window.GetWidget("difficulty", true))
 end
 
--- A new options window shows the player's options.
+local function slider(window, id)
+    return ox.gui.CSliderWidget.Cast(window.GetWidget(id, true))
+end
+
+-- A new options window shows the player's options: line 1 of the screen modes is the full
+-- screen, a slider's 0 to 1 a volume's 0 to 100.
 function OptionsWindow.Show(window)
     local game = options()
-    local fullscreen, difficulty = controls(window)
-    if game and fullscreen and difficulty then
-        fullscreen.Check(game.GetFullScreenMode(), false)
-        difficulty.Check(game.GetDificultyLevel())
+    local screen, difficulty = controls(window)
+    if not (game and screen and difficulty) then
+        return
+    end
+    screen.SelectLine(game.GetFullScreenMode() and 1 or 0, false)
+    difficulty.Check(game.GetDificultyLevel())
+    for id, volume in pairs(volumes) do
+        local control = slider(window, id)
+        if control then
+            control.SetValue(game[volume.get]() / 100, false)
+        end
     end
 end
 
 function OptionsWindow.OnChildAction(self, action, sender)
     local what = text(action)
-    if what == "check_changed" or what == "change_checked" then
-        say(what .. " " .. text(sender.GetId()))
+    local id = text(sender.GetId())
+    local game = options()
+    if what == "value_changed" and volumes[id] then
+        local control = slider(self, id)
+        if game and control then
+            game[volumes[id].set](control.GetValue() * 100)
+            game.ApplyMusicChanges()
+        end
         return true
     end
-    if what ~= "pressed" or text(sender.GetId()) ~= "ok" then
+    if what == "check_changed" or what == "change_checked" or what == "line_selected" or what == "list_showed" then
+        say(what .. " " .. id)
+        return true
+    end
+    if what ~= "pressed" or id ~= "ok" then
         return false
     end
-    local fullscreen, difficulty = controls(self)
-    local game = options()
-    if game and fullscreen and difficulty then
-        game.SetFullScreenMode(fullscreen.IsChecked())
+    local screen, difficulty = controls(self)
+    if game and screen and difficulty then
+        game.SetFullScreenMode(screen.GetSelectedLine() == 1)
         game.SetDificultyLevel(difficulty.GetChecked())
         game.ApplyOptionsChanges()
+        game.ApplyMusicChanges()
         game.UpdateLocalSettings()
         game.Save()
         say("options applied")

@@ -77,6 +77,8 @@ void CListWidget::Load(const core::CSettingsGroup& node, const core::CSettingsGr
     for (int i = 0; i < 4; ++i)
         ReadColorChecked(tmpl, kColorKeys[i], m_Colors[i]);
     m_Font = ReadFont(tmpl, "font");
+    if (!m_Font)
+        ReportElement(node, "a list without a font in its template shows no lines");
     if (!tmpl.GetValue("scroll_template").empty())
         MakeScroll(tmpl.GetValue("scroll_template"), templates);
     ReadImage(tmpl, "background", GetBackground()->GetImage());
