@@ -10,6 +10,7 @@
 #include "gui/controls/ComboBoxWidget.h"
 #include "gui/controls/EditWidget.h"
 #include "gui/controls/LabelWidget.h"
+#include "lua/Lua.h"
 #include "misc/Unicode.h"
 
 #include <chrono>
@@ -40,11 +41,12 @@ int ViewFonts()
     };
     for (int i = 0; i < 300 && !(app.GetTopWindow() && app.GetTopWindow()->GetId() == "main_menu"); ++i)
         frame();
-    const core::CSettings& settings = app.GetSettings();
-    boost::intrusive_ptr<k17::CFontViewerWindow> viewer(new k17::CFontViewerWindow());
-    viewer->Load(settings.GetChildByAttribute("window", "id", "font_viewer", true), settings.GetChild("GUITemplates"));
-    viewer->UpdateLayout();
-    app.GetTopWindow()->AddChildWindow(viewer);
+    // Opened as the demo's F11 does, by its script.
+    lua::CallLuaFunction<void>(lua::CLua::GetLua("main"), "DevTools.OpenFontViewer");
+    boost::intrusive_ptr<k17::CFontViewerWindow> viewer(
+        dynamic_cast<k17::CFontViewerWindow*>(app.GetTopWindow()));
+    if (!viewer)
+        return 13;
     frame();
     auto* fonts = dynamic_cast<gui::CComboBoxWidget*>(viewer->GetWidget("combobox_fonts", true));
     auto* edit = dynamic_cast<gui::CEditWidget*>(viewer->GetWidget("edit_text", true));

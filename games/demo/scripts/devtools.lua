@@ -1,6 +1,7 @@
 -- Lantern Demo: the developer window (gui.xml, window "devtools"): the running level's scenes
 -- and their objects as a tree. F12 in the first window opens it while the debug level of
--- game.xml allows it (DebugLight or more). main.lua loads this file.
+-- game.xml allows it (DebugLight or more); F11 opens the font viewer (gui.xml, window
+-- "font_viewer") at the same level. main.lua loads this file.
 
 DevTools = DevTools or {}
 DevToolsWnd = DevToolsWnd or {}
@@ -26,6 +27,25 @@ function DevTools.Open()
         print("Lantern Demo: the developer window opens")
         DevTools.Fill(ox.gui.CTreeWidget.Cast(wnd.GetWidget("devtools_tree", true)))
     end
+end
+
+-- The font viewer of game makers over the first window: the declared fonts, a text typed
+-- in them, rebuilt when a font's file is saved again.
+function DevTools.OpenFontViewer()
+    if not DevTools.Allowed() then
+        print("Lantern Demo: the font viewer needs debug level 2")
+        return nil
+    end
+    local node, templates = Menu.Describe("font_viewer")
+    if not node then
+        return nil
+    end
+    local viewer = k17.CFontViewerWindow()
+    viewer.Load(node, templates)
+    viewer.UpdateLayout()
+    g_Application.GetTopWindow().AddChildWindow(viewer)
+    print("Lantern Demo: the font viewer opens")
+    return viewer
 end
 
 -- One group for the level, one for each scene, one line for each object ("[group]" marks
@@ -81,6 +101,9 @@ if DemoWindow.OnKeyDown ~= DevTools.on_key then
     DevTools.on_key = function(self, key, mods, raw, broadcast)
         if not broadcast and key == ox.gui.OX_F12 then
             DevTools.Open()
+            return true
+        elseif not broadcast and key == ox.gui.OX_F11 then
+            DevTools.OpenFontViewer()
             return true
         end
         return base_key(self, key, mods, raw, broadcast)
