@@ -6,6 +6,7 @@
 #include "diag/Log.h"
 #include "game/LevelState.h"
 #include "quest/Level.h"
+#include "gui/GuiServices.h"
 #include "gui/Window.h"
 #include "gui/WidgetFactory.h"
 
@@ -52,6 +53,16 @@ void SetText(gui::CWidget* widget, const wstring& text)
     line->SetText(text);
 }
 
+// Places `window` centred on the canvas as a child of the top window: a child window's place
+// is relative to its parent's, and the demo's windows open over the first window or a menu.
+void CentreWindow(gui::CBaseWindow* window)
+{
+    OX_CHECK_DATA(window && core::g_Application && core::g_Application->GetTopWindow());
+    const misc::FloatVector canvas = gui::GetGuiServices().canvas;
+    const misc::FloatVector parent = core::g_Application->GetTopWindow()->GetAbsPos(true);
+    window->SetOffset((canvas.X - window->GetSize().X) / 2 - parent.X, (canvas.Y - window->GetSize().Y) / 2 - parent.Y);
+}
+
 gui::CWindow* OpenWindow(const std::string& id)
 {
     OX_CHECK_DATA(core::g_Application && core::g_Application->GetTopWindow(), nullptr);
@@ -64,6 +75,7 @@ gui::CWindow* OpenWindow(const std::string& id)
     gui::WindowPtrT window(new gui::CWindow());
     window->Load(node, settings.GetChild("GUITemplates"));
     window->UpdateLayout();
+    CentreWindow(window.get());
     core::g_Application->GetTopWindow()->AddChildWindow(window);
     return window.get();
 }
@@ -77,6 +89,7 @@ mluabind::Namespace BindDemoShell()
     mluabind::Namespace ns("demo");
     ns.AddFunction(mluabind::Function("SetText", &SetText));
     ns.AddFunction(mluabind::Function("OpenWindow", &OpenWindow));
+    ns.AddFunction(mluabind::Function("CentreWindow", &CentreWindow));
     ns.AddFunction(mluabind::Function("SaveLevelState", &SaveLevelState));
     ns.AddFunction(mluabind::Function("RestoreLevelState", &RestoreLevelState));
     return ns;

@@ -9,8 +9,9 @@ namespace k17 {
 void RegisterDemoShellWidgets();
 
 // "demo": SetText(widget, text) for a demo_text_widget (anything else is logged and left),
-// and OpenWindow(id), which builds the window of that id from the GUI description, puts it
-// on top of the top window and gives it (nil for an unknown id); SaveLevelState and
+// OpenWindow(id), which builds the window of that id from the GUI description, puts it on
+// top of the top window, centred on the canvas, and gives it (nil for an unknown id);
+// CentreWindow(window), the same place for a window about to open; SaveLevelState and
 // RestoreLevelState (game/LevelState.h).
 mluabind::Namespace BindDemoShell();
 

@@ -26,9 +26,19 @@ const char* const kStage = R"(
     lantern = { level = level }
     StartLevel = function() note('level built') lantern.level = level end
     texts = {}
+    players = { lines = {}, selected = -1 }
+    players.GetId = function() return 'players' end
+    players.ClearLines = function() players.lines = {} end
+    players.AddLine = function(text) table.insert(players.lines, text) end
+    players.SelectLine = function(index) players.selected = index end
+    players.GetSelectedLine = function() return players.selected end
+    players.GetLine = function(index) return players.lines[index + 1] end
     local function window(id)
         return { id = id,
-                 GetWidget = function(name) if name ~= 'records_table' then return name end end,
+                 GetWidget = function(name)
+                     if name == 'players' then return players end
+                     if name ~= 'records_table' then return name end
+                 end,
                  GetParentWindow = function() return { RemoveChildWindow = function() note('closed ' .. id) end } end }
     end
     demo = {
@@ -71,8 +81,9 @@ TEST(DemoProfilesScript, ChooserPlayersRecordsAndSaves)
         local a = texts.current
         press('new_profile')
         press('new_profile')
-        local b = texts.current .. '|' .. texts.slot1_name .. '|' .. texts.slot2_name .. '|' .. texts.slot3_name
-        press('slot1')
+        local b = texts.current .. '|' .. table.concat(players.lines, '|') .. '|' .. players.selected
+        players.SelectLine(0)
+        ProfilesWnd.OnChildAction(last_window, 'line_selected', players)
         local c = texts.current
         DemoWindow.OnKeyDown(nil, 70, 0, 0, false)
         local d = texts.place1 .. ' ' .. texts.name1 .. ' ' .. (texts.score1:gsub('%d+$', 'N'))
@@ -80,7 +91,7 @@ TEST(DemoProfilesScript, ChooserPlayersRecordsAndSaves)
         quest.OnClose()
         return table.concat({a, b, c, d}, '/') .. '\n' .. table.concat(log, ', ')
     )"),
-              "Nobody plays yet: add a new player/Playing: Player 2|Player 1|Player 2|/Playing: Player 1/"
+              "Nobody plays yet: add a new player/Playing: Player 2|Player 1|Player 2|1/Playing: Player 1/"
               "1. Player 1 N\n"
               "base run, open profiles, level built, save, level built, save, level built, restore, save, "
               "open records, base key, save, base close");

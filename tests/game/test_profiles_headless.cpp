@@ -94,7 +94,7 @@ int PlayThePlayers()
     ox::gui::CBaseWindow* chooser = loading->GetChildWindow();
     if (!chooser || !oxtest::PressWidget(chooser, "new_profile"))
         return 11;
-    if (!chooser->GetWidget("slot1", true) || chooser->GetWidget("slot1", true)->GetSize().X < 300)
+    if (!chooser->GetWidget("players", true) || chooser->GetWidget("players", true)->GetSize().X < 300)
         return 12;
     if (!oxtest::PressWidget(chooser, "show_records") || !oxtest::PressWidget(chooser->GetChildWindow(), "close_records"))
         return 13;

@@ -43,6 +43,7 @@ function DevTools.OpenFontViewer()
     local viewer = k17.CFontViewerWindow()
     viewer.Load(node, templates)
     viewer.UpdateLayout()
+    demo.CentreWindow(viewer)
     g_Application.GetTopWindow().AddChildWindow(viewer)
     print("Lantern Demo: the font viewer opens")
     return viewer

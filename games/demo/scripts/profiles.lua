@@ -148,18 +148,36 @@ function Profiles.OpenChooser()
     end
 end
 
-function Profiles.FillChooser(wnd)
+-- The list of players in the chooser (a Lua stand-in passes as it is), or nil.
+local function players_list(widget)
+    if type(widget) == "userdata" then
+        return ox.gui.CListWidget.Cast(widget)
+    end
+    return type(widget) == "table" and widget or nil
+end
+
+local function show_current(wnd)
     local current = Profiles.Current()
     set(wnd, "current", current and ("Playing: " .. S(current.GetName())) or "Nobody plays yet: add a new player")
-    Profiles.slots = {}
-    local count = manager().EnumProfiles()
-    -- The four newest players.
-    for slot = 1, 4 do
-        local player = manager().GetProfile(math.max(count, 4) - 4 + slot - 1)
-        local name = player and S(player.GetName()) or ""
-        Profiles.slots[slot] = name
-        set(wnd, "slot" .. slot .. "_name", name)
+    return current
+end
+
+function Profiles.FillChooser(wnd)
+    local current = show_current(wnd)
+    local list = players_list(wnd.GetWidget("players", true))
+    if not list then
+        return
     end
+    list.ClearLines()
+    local selected = -1
+    for index = 0, manager().EnumProfiles() - 1 do
+        local name = S(manager().GetProfile(index).GetName())
+        list.AddLine(name)
+        if current and name == S(current.GetName()) then
+            selected = index
+        end
+    end
+    list.SelectLine(selected, false)
 end
 
 -- The box a new player's name is typed in, or nil.
@@ -170,7 +188,6 @@ end
 
 function ProfilesWnd.OnChildAction(wnd, action, sender)
     local id = S(sender.GetId())
-    local slot = tonumber(id:match("^slot(%d)$") or "")
     if id == "new_name" then
         -- Typing changes nothing until "New player"; while the box has the focus the first
         -- window's letter keys are letters of a name.
@@ -178,14 +195,22 @@ function ProfilesWnd.OnChildAction(wnd, action, sender)
             Profiles.typing = action == "got_focus"
         end
         return true
-    elseif slot and Profiles.slots and Profiles.slots[slot] ~= "" then
-        Profiles.Switch(Profiles.slots[slot])
+    elseif id == "players" then
+        -- The list keeps its lines: it is in the middle of reporting one of them.
+        local list = players_list(sender)
+        local line = list and list.GetSelectedLine() or -1
+        if line >= 0 then
+            Profiles.Switch(S(list.GetLine(line)))
+            show_current(wnd)
+        end
+        return true
     elseif id == "new_profile" then
         local box = name_box(wnd)
         Profiles.NewPlayer(box and S(box.GetText()))
         if box then
             box.SetText("")
         end
+        Profiles.FillChooser(wnd)
     elseif id == "show_records" then
         Records.Open()
         return true
@@ -195,9 +220,8 @@ function ProfilesWnd.OnChildAction(wnd, action, sender)
         end
         Profiles.typing = false
         close(wnd)
-        return true
     end
-    Profiles.FillChooser(wnd)
+    -- Anything else (the list's own scroll bar, say) leaves the chooser as it is.
     return true
 end
 
