@@ -10,6 +10,7 @@
 #include "gui/controls/ComboBoxWidget.h"
 #include "gui/controls/ListWidget.h"
 #include "gui/controls/SliderWidget.h"
+#include "gui/controls/TabWidget.h"
 #include "DemoChild.h"
 #include "support/TestSupport.h"
 
@@ -95,6 +96,14 @@ int ChooseOptions()
         return 14;
 
     PushClick(app, CanvasPoint(*music, 0.25f, 0.5f));
+    // The screen mode is on the second page, whose tab shows it.
+    auto* tabs = dynamic_cast<gui::CTabWidget*>(options->GetWidget("options_tabs", true));
+    if (!tabs || tabs->EnumPanels() != 2)
+        return 19;
+    PushClick(app, CanvasPoint(*tabs->GetPanels()[1].button, 0.5f, 0.5f));
+    until("options");
+    if (tabs->GetSelectedPanel() != 1)
+        return 20;
     PushClick(app, CanvasPoint(*screen->GetButton(), 0.5f, 0.5f));
     until("options");
     if (!screen->IsListShown())
