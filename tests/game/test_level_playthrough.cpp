@@ -239,6 +239,10 @@ TEST(LevelPlaythrough, TheDemoLevelIsPlayedToItsEndWithTheMouse)
     // It charged again while the level went on.
     const size_t charged = output.find("Lantern Demo: the hint is charged again", hint);
     EXPECT_LT(charged, output.find("Lantern Demo: the level is complete")) << output << errors;
+    // The level's end enters the score into the table of records.
+    ExpectInOrder(output, {"Lantern Demo: the level is complete", "Lantern Demo: level1 finished by "});
+    const fs::path records = demo.dir / "xdg" / "Lanternfold" / "Lantern Demo" / "saves" / "records.xml";
+    EXPECT_NE(oxtest::ReadFile(records).find("score="), std::string::npos) << oxtest::ReadFile(records);
     EXPECT_EQ(errors.find("Lua Error"), std::string::npos) << errors;
 }
 
