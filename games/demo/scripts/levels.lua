@@ -58,10 +58,10 @@ function Levels.Finished()
     local done = lantern.level_id or Levels.order[1]
     local next = Levels.Next(done)
     print("Lantern Demo: " .. done .. " is over; " .. (next and (next .. " comes next") or "the quest is complete"))
-    if Profiles and Profiles.EnterScore then
-        Profiles.EnterScore()
-    end
     local who = player()
+    if who and Profiles and Profiles.EnterScore then
+        Profiles.EnterScore(who)
+    end
     if who then
         who.SetStep(next or Levels.order[1])
         who.SetStepType(k17.GameStepTypeLevel)

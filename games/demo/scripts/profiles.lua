@@ -113,10 +113,8 @@ function Profiles.NewPlayer(typed)
     return name
 end
 
--- The level is over: the player's score enters the table (a player is made when nobody
--- plays yet); the place it took.
-function Profiles.EnterScore()
-    local player = Profiles.Current() or manager().GetProfile(Profiles.NewPlayer())
+-- The level is over: `player`'s score enters the table; the place it took.
+function Profiles.EnterScore(player)
     local seconds = os.time() - (Profiles.started or os.time())
     local score = math.max(10, 1000 - seconds)
     player.SetLevelState(k17.LevelStateTypeFinished)
@@ -128,9 +126,10 @@ function Profiles.EnterScore()
     return place
 end
 
--- F: the level ends now; the score enters the table, which opens.
+-- F: the level ends now; the score enters the table (a player is made when nobody plays
+-- yet), which opens.
 function Profiles.LevelFinished()
-    Profiles.EnterScore()
+    Profiles.EnterScore(Profiles.Current() or manager().GetProfile(Profiles.NewPlayer()))
     Records.Open()
 end
 
