@@ -3,8 +3,7 @@
 // clipboard, a slip undone) while the first window's letter keys stay letters, then "New
 // player" makes that player the current one.
 #include "DemoChild.h"
-#include "core/platform/StandaloneApplicationSdl.h"
-#include "game/App.h"
+#include "DemoGame.h"
 #include "game/Profile.h"
 #include "gui/Window.h"
 #include "gui/controls/EditWidget.h"
@@ -49,23 +48,13 @@ void PushKey(SDL_Keycode key, SDL_Scancode scancode, uint16_t modifiers)
 // would; writes the box's text after each step, then the current player's name.
 int TypeAName()
 {
-    k17::CApp app;
-    app.ReadGameFolder();
-    if (!app.Init())
-        return 10;
-    gui::BaseWindowPtrT loading = app.CreateLoadWindow();
-    app.SetMainWindow(loading);
-    auto* adapter = dynamic_cast<core::CStandaloneApplicationSdl*>(app.GetSystemIntegration());
-    if (!adapter)
-        return 11;
-    auto frame = [&] {
-        adapter->PumpMessages();
-        app.Update();
-        app.Draw();
-    };
-    auto top = [&app](const char* id) { return app.GetTopWindow() && app.GetTopWindow()->GetId() == id; };
-    for (int i = 0; i < 300 && !top("main_menu"); ++i)
-        frame();
+    oxtest::DemoGame game;
+    if (const int failed = game.Start())
+        return failed;
+    k17::CApp& app = game.app;
+    auto frame = [&game] { game.Frame(); };
+    auto top = [&game](const char* id) { return game.TopIs(id); };
+    game.Until("main_menu");
     lua::CLua* mainLua = lua::CLua::GetLua("main");
     if (!mainLua || !top("main_menu"))
         return 12;
@@ -115,9 +104,7 @@ int TypeAName()
     frame();
     out << "|" << name(k17::g_ProfileManager::Instance().GetCurrentProfile()) << " " << players->EnumLines();
     out.close();
-    app.Stop();
-    loading.reset();
-    app.DoShutdown();
+    game.Stop();
     return 0;
 }
 

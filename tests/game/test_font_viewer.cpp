@@ -2,9 +2,8 @@
 // declared fonts, the label shows the typed text in the chosen one, a font file saved again
 // rebuilds the label, and Escape closes the window.
 #include "DemoChild.h"
+#include "DemoGame.h"
 #include "core/FontManager.h"
-#include "core/platform/StandaloneApplicationSdl.h"
-#include "game/App.h"
 #include "game/FontViewerWindow.h"
 #include "gui/WidgetManager.h"
 #include "gui/controls/ComboBoxWidget.h"
@@ -25,22 +24,12 @@ std::string g_Out;
 
 int ViewFonts()
 {
-    k17::CApp app;
-    app.ReadGameFolder();
-    if (!app.Init())
-        return 10;
-    gui::BaseWindowPtrT loading = app.CreateLoadWindow();
-    app.SetMainWindow(loading);
-    auto* adapter = dynamic_cast<core::CStandaloneApplicationSdl*>(app.GetSystemIntegration());
-    if (!adapter)
-        return 11;
-    auto frame = [&] {
-        adapter->PumpMessages();
-        app.Update();
-        app.Draw();
-    };
-    for (int i = 0; i < 300 && !(app.GetTopWindow() && app.GetTopWindow()->GetId() == "main_menu"); ++i)
-        frame();
+    oxtest::DemoGame game;
+    if (const int failed = game.Start())
+        return failed;
+    k17::CApp& app = game.app;
+    auto frame = [&game] { game.Frame(); };
+    game.Until("main_menu");
     // Opened as the demo's F11 does, by its script.
     lua::CallLuaFunction<void>(lua::CLua::GetLua("main"), "DevTools.OpenFontViewer");
     boost::intrusive_ptr<k17::CFontViewerWindow> viewer(
@@ -76,9 +65,7 @@ int ViewFonts()
     out << "|" << app.GetTopWindow()->GetId();
     out.close();
     viewer.reset();
-    app.Stop();
-    loading.reset();
-    app.DoShutdown();
+    game.Stop();
     return 0;
 }
 
